@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "core/KSDate.h"
+#include "platform/HealthStore.h"
+
+namespace keepsakes {
+
+struct GeoPoint {
+    double latitude = 0;   ///< Degrees north.
+    double longitude = 0;  ///< Degrees east.
+
+    friend bool operator==(const GeoPoint&, const GeoPoint&) = default;
+};
+
+/// Where the offset of a local time came from, best first.
+enum class TimeSource { offset, gps, track, ownerZone };
+
+struct PublicEventRecord {
+    std::string name;
+    std::vector<std::string> performers;
+    std::string venue;
+
+    friend bool operator==(const PublicEventRecord&, const PublicEventRecord&) = default;
+};
+
+/// What one photo's metadata says.
+struct PhotoRecord {
+    KSDate taken;  ///< The instant, by `timeSource`.
+    TimeSource timeSource = TimeSource::ownerZone;
+    KSDate localTime;  ///< What the camera's clock showed, written as though it were UTC.
+    std::optional<GeoPoint> position;
+    std::vector<std::string> inferences;  ///< Words of the inference table, distinct.
+    std::vector<std::string> persons;     ///< Names, distinct.
+    std::vector<std::string> holidays;
+    std::vector<PublicEventRecord> publicEvents;
+
+    friend bool operator==(const PhotoRecord&, const PhotoRecord&) = default;
+};
+
+/// A time for which a track's own timestamps say how far local time is from UTC.
+struct ZoneSpan {
+    KSDateInterval span;
+    int offsetSeconds = 0;
+
+    friend bool operator==(const ZoneSpan&, const ZoneSpan&) = default;
+};
+
+/// Everything that one file holds for the index.
+struct FileRecords {
+    std::vector<WorkoutSample> workouts;
+    std::vector<PhotoRecord> photos;
+    std::vector<ZoneSpan> zones;
+
+    friend bool operator==(const FileRecords&, const FileRecords&) = default;
+};
+
+}  // namespace keepsakes

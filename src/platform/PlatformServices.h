@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <filesystem>
+#include <functional>
+
+namespace keepsakes {
+
+class AnalyticsService;
+class Clock;
+class DeviceDataIndex;
+class DevicePolicy;
+class HealthStore;
+class LockState;
+class PhotoAnalysis;
+class UserDefaults;
+
+/// Everything that the daemon needs from the device it runs on, put together by the composition
+/// root. None is null; all outlive the services.
+struct PlatformServices {
+    Clock* clock = nullptr;
+    DevicePolicy* devicePolicy = nullptr;
+    LockState* lockState = nullptr;
+    UserDefaults* userDefaults = nullptr;
+    AnalyticsService* analytics = nullptr;
+    HealthStore* healthStore = nullptr;
+    PhotoAnalysis* photoAnalysis = nullptr;
+    DeviceDataIndex* deviceData = nullptr;
+    /// The daemon's folder for the database and its property lists; made when missing.
+    std::filesystem::path cacheFolder;
+    /// Ends the process at once with this status (a fatal watchdog does).
+    std::function<void(int status)> exitProcess;
+};
+
+}  // namespace keepsakes
