@@ -100,14 +100,14 @@ KSDate fromLocal(KSDate local) {
 }
 
 std::string fullDateLongTime(KSDate date) {
-    const std::unique_ptr<icu::DateFormat> format(icu::DateFormat::createDateTimeInstance(
-        icu::DateFormat::kFull, icu::DateFormat::kLong));
+    const std::unique_ptr<icu::DateFormat> format(
+        icu::DateFormat::createDateTimeInstance(icu::DateFormat::kFull, icu::DateFormat::kLong));
     return formatWith(format.get(), date);
 }
 
 std::string shortDateLongTime(KSDate date) {
-    const std::unique_ptr<icu::DateFormat> format(icu::DateFormat::createDateTimeInstance(
-        icu::DateFormat::kShort, icu::DateFormat::kLong));
+    const std::unique_ptr<icu::DateFormat> format(
+        icu::DateFormat::createDateTimeInstance(icu::DateFormat::kShort, icu::DateFormat::kLong));
     return formatWith(format.get(), date);
 }
 

@@ -15,7 +15,7 @@ namespace {
 
 /// Owns a file descriptor.
 class Descriptor {
- public:
+  public:
     explicit Descriptor(int fd) : fd_(fd) {}
     ~Descriptor() {
         if (fd_ >= 0) ::close(fd_);
@@ -24,7 +24,7 @@ class Descriptor {
     Descriptor& operator=(const Descriptor&) = delete;
     int get() const { return fd_; }
 
- private:
+  private:
     int fd_;
 };
 
@@ -40,9 +40,9 @@ bool writeAll(int fd, std::string_view content) {
 }  // namespace
 
 KSError posixError(int code, std::string_view what, const std::filesystem::path& path) {
-    return KSError::make(kPosixErrorDomain, code,
-                         fmt::format("{} {}: {}", what, path.string(),
-                                     std::generic_category().message(code)));
+    return KSError::make(
+        kPosixErrorDomain, code,
+        fmt::format("{} {}: {}", what, path.string(), std::generic_category().message(code)));
 }
 
 std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
@@ -50,7 +50,7 @@ std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
     // Without O_NONBLOCK, opening a pipe that somebody left in the folder would wait for ever.
     const Descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     if (file.get() < 0) return std::unexpected(posixError(errno, "open", path));
-    struct stat info{};
+    struct stat info {};
     if (::fstat(file.get(), &info) != 0) return std::unexpected(posixError(errno, "stat", path));
     if (!S_ISREG(info.st_mode)) return std::unexpected(posixError(EINVAL, "not a file:", path));
     if (static_cast<std::uintmax_t>(info.st_size) > largest) {

@@ -40,15 +40,19 @@ struct ToJson {
 
 KSValue fromJson(const json& value) {
     switch (value.type()) {
-        case json::value_t::boolean: return value.get<bool>();
-        case json::value_t::number_integer: return value.get<std::int64_t>();
+        case json::value_t::boolean:
+            return value.get<bool>();
+        case json::value_t::number_integer:
+            return value.get<std::int64_t>();
         case json::value_t::number_unsigned: {
             const auto number = value.get<std::uint64_t>();
             if (number > INT64_MAX) return static_cast<double>(number);
             return static_cast<std::int64_t>(number);
         }
-        case json::value_t::number_float: return value.get<double>();
-        case json::value_t::string: return value.get<std::string>();
+        case json::value_t::number_float:
+            return value.get<double>();
+        case json::value_t::string:
+            return value.get<std::string>();
         case json::value_t::array: {
             KSArray array;
             array.reserve(value.size());
@@ -60,7 +64,8 @@ KSValue fromJson(const json& value) {
             for (const auto& [key, item] : value.items()) dictionary.emplace(key, fromJson(item));
             return dictionary;
         }
-        default: return {};
+        default:
+            return {};
     }
 }
 

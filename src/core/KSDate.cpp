@@ -13,7 +13,7 @@ namespace {
 
 /// A cursor over the text; every reader leaves it where it was when it answers no.
 class Cursor {
- public:
+  public:
     explicit Cursor(std::string_view text) : rest_(text) {}
 
     bool atEnd() const { return rest_.empty(); }
@@ -49,7 +49,7 @@ class Cursor {
         return any ? std::optional(value) : std::nullopt;
     }
 
- private:
+  private:
     std::string_view rest_;
     char last_ = 0;
 };
@@ -130,8 +130,7 @@ std::optional<ParsedDate> parseISO8601(std::string_view text) {
 
     const auto days = chr::sys_days(ymd).time_since_epoch().count();
     const double unixSeconds = static_cast<double>(days) * 86400.0 + time.hour * 3600 +
-                               time.minute * 60 + time.second + time.fraction -
-                               offset.value_or(0);
+                               time.minute * 60 + time.second + time.fraction - offset.value_or(0);
     return ParsedDate{KSDate::fromUnix(unixSeconds), offset};
 }
 

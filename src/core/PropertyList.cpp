@@ -67,9 +67,7 @@ struct AppendNode {
     void operator()(double value) { text("real", fmt::format("{}", value)); }
     void operator()(const std::string& value) { text("string", value); }
     void operator()(const KSValue::Bytes& value) { text("data", base64(value)); }
-    void operator()(KSDate value) {
-        text("date", formatISO8601({std::floor(value.seconds)}));
-    }
+    void operator()(KSDate value) { text("date", formatISO8601({std::floor(value.seconds)})); }
     void operator()(const KSUUID& value) { text("string", value.string()); }
     void operator()(const KSArray& value) {
         auto node = parent.append_child("array");
@@ -168,8 +166,8 @@ std::expected<KSDictionary, KSError> parsePropertyList(std::string_view text) {
     pugi::xml_document document;
     const auto result = document.load_buffer(text.data(), text.size());
     if (!result) {
-        return failure(1, fmt::format("property list: {} at byte {}", result.description(),
-                                      result.offset));
+        return failure(
+            1, fmt::format("property list: {} at byte {}", result.description(), result.offset));
     }
     const auto root = document.child("plist").first_child();
     auto value = readNode(root, 0);

@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "core/Text.h"
+
+#include <unicode/locid.h>
+#include <unicode/unistr.h>
+#include <unicode/utf8.h>
+
+#include <cstdint>
+
+namespace keepsakes {
+
+std::string lowerCased(std::string_view text) {
+    auto wide = icu::UnicodeString::fromUTF8({text.data(), static_cast<std::int32_t>(text.size())});
+    wide.toLower(icu::Locale::getRoot());
+    std::string lowered;
+    wide.toUTF8String(lowered);
+    return lowered;
+}
+
+bool isPlainUtf8(std::string_view text) {
+    const auto* bytes = reinterpret_cast<const std::uint8_t*>(text.data());
+    const auto size = static_cast<std::int64_t>(text.size());
+    for (std::int64_t at = 0; at < size;) {
+        UChar32 point = 0;
+        U8_NEXT(bytes, at, size, point);
+        if (point <= 0) return false;
+    }
+    return true;
+}
+
+}  // namespace keepsakes
