@@ -28,7 +28,8 @@ add_library(keepsakes_options INTERFACE)
 target_compile_features(keepsakes_options INTERFACE cxx_std_23)
 target_compile_options(keepsakes_options INTERFACE
     -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor
-    -Woverloaded-virtual -Wold-style-cast -Werror)
+    -Woverloaded-virtual -Wold-style-cast -Werror
+    -Wno-missing-field-initializers)  # designated initialisers leave the others at their defaults
 
 # keepsakes_library(<folder> [SOURCES ...] [DEPS <folder>...] [PUBLIC ...] [PRIVATE ...])
 #

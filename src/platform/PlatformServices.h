@@ -7,12 +7,14 @@
 namespace keepsakes {
 
 class AnalyticsService;
+class BusListener;
 class Clock;
 class DeviceDataIndex;
 class DevicePolicy;
 class HealthStore;
 class LockState;
 class PhotoAnalysis;
+class Problems;
 class UserDefaults;
 
 /// Everything that the daemon needs from the device it runs on, put together by the composition
@@ -26,6 +28,8 @@ struct PlatformServices {
     HealthStore* healthStore = nullptr;
     PhotoAnalysis* photoAnalysis = nullptr;
     DeviceDataIndex* deviceData = nullptr;
+    BusListener* listener = nullptr;
+    Problems* problems = nullptr;
     /// The daemon's folder for the database and its property lists; made when missing.
     std::filesystem::path cacheFolder;
     /// Ends the process at once with this status (a fatal watchdog does).

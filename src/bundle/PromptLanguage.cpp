@@ -1,0 +1,228 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "bundle/PromptLanguage.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <array>
+#include <optional>
+#include <utility>
+#include <vector>
+
+#include "core/Calendar.h"
+#include "model/KSEventBundle.h"
+
+namespace keepsakes {
+
+namespace {
+
+// ---- The words. To translate the daemon, translate these. ----
+
+struct Phrase {
+    std::string_view key;
+    std::string_view text;
+};
+
+constexpr auto kRuleSentences = std::to_array<Phrase>({
+    {"HikingPlusPhotos", "A hike with photos"},
+    {"WeddingPhotos", "A wedding"},
+    {"AnniversaryPhotos", "An anniversary"},
+    {"BirthdayPhotos", "A birthday"},
+    {"VisitPlusConcert", "A concert"},
+    {"VisitPlusAmusementPark", "A visit to an amusement park"},
+    {"CardioActivity", "A cardio workout"},
+    {"ActiveBabyParent", "Active with the baby"},
+    {"BabyParent", "Time with the baby"},
+    {"ActivePetParent", "Active with a pet"},
+    {"PetParent", "Time with a pet"},
+    {"MediaOnRepeat", "Played again and again"},
+    {"TravelEvent", "A trip"},
+    {"StructuredEventMovie", "A film"},
+    {"StructuredEventTransportation", "On the way"},
+    {"SignificantContactInteraction", "In touch with somebody close"},
+});
+
+/// What a cluster is called by the categories in it; the first row that fits.
+struct ClusterSentence {
+    bool workout;
+    bool photos;
+    bool visit;
+    std::string_view text;
+};
+constexpr auto kClusterSentences = std::to_array<ClusterSentence>({
+    {true, true, false, "A workout with photos"},
+    {true, false, false, "A workout"},
+    {false, true, true, "A visit with photos"},
+    {false, true, false, "Photos"},
+    {false, false, true, "A visit"},
+    {false, false, false, "A moment"},
+});
+
+/// What photos show, by inference word; words that say nothing about a picture are not here.
+constexpr auto kSubjects = std::to_array<Phrase>({
+    {"wedding", "a wedding"},
+    {"anniversary", "an anniversary"},
+    {"birthday", "a birthday"},
+    {"baby", "a baby"},
+    {"pet", "a pet"},
+    {"concert", "a concert"},
+    {"performance", "a performance"},
+    {"festival", "a festival"},
+    {"amusementpark", "an amusement park"},
+    {"theater", "the theatre"},
+    {"museum", "a museum"},
+    {"sportevent", "a match"},
+    {"celebration", "a celebration"},
+    {"holidayevent", "a holiday"},
+    {"gathering", "a gathering"},
+    {"nightout", "a night out"},
+    {"dance", "dancing"},
+    {"mountain", "mountains"},
+    {"beach", "the beach"},
+    {"beaching", "the beach"},
+    {"wintersport", "winter sports"},
+    {"climbing", "climbing"},
+    {"diving", "diving"},
+    {"hiking", "hiking"},
+    {"trip", "a trip"},
+    {"nature", "nature"},
+});
+
+constexpr std::string_view kDay = "EEEE";
+constexpr std::string_view kTime = "HH:mm";
+
+std::string timeText(KSDateInterval span) {
+    const auto day = calendar::format(span.start, kDay);
+    const auto from = calendar::format(span.start, kTime);
+    const auto to = calendar::format(span.end, kTime);
+    if (calendar::startOfDay(span.start) != calendar::startOfDay(span.end)) {
+        return fmt::format("{} {} to {} {}", day, from, calendar::format(span.end, kDay), to);
+    }
+    return from == to ? fmt::format("{} {}", day, from) : fmt::format("{} {} to {}", day, from, to);
+}
+
+std::string photosText(std::int64_t count, std::string_view subject) {
+    auto text = count == 1 ? "1 photo" : count > 1 ? fmt::format("{} photos", count) : "photos";
+    if (!subject.empty()) text += fmt::format(" of {}", subject);
+    return text;
+}
+
+std::string peopleText(const std::vector<std::string>& names) {
+    constexpr std::size_t kMostNamed = 3;
+    std::string text = "with ";
+    const auto named = std::min(names.size(), kMostNamed);
+    for (std::size_t index = 0; index < named; ++index) {
+        const bool last = index + 1 == names.size();
+        if (index > 0) text += last ? " and " : ", ";
+        text += names[index];
+    }
+    if (names.size() > named) text += fmt::format(" and {} others", names.size() - named);
+    return text;
+}
+
+// ---- What the events hold. ----
+
+template <std::size_t N>
+std::string_view phraseOf(const std::array<Phrase, N>& phrases, std::string_view key) {
+    const auto found = std::ranges::find(phrases, key, &Phrase::key);
+    return found == phrases.end() ? std::string_view() : found->text;
+}
+
+bool holds(const KSEventBundle& bundle, KSEventCategory category) {
+    return std::ranges::any_of(
+        bundle.events, [category](const auto& event) { return event->category() == category; });
+}
+
+std::string_view headline(const KSEventBundle& bundle) {
+    if (const auto sentence = phraseOf(kRuleSentences, bundle.bundleType); !sentence.empty()) {
+        return sentence;
+    }
+    const bool workout = holds(bundle, KSEventCategory::workout);
+    const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
+    const bool visit = holds(bundle, KSEventCategory::visit);
+    for (const auto& row : kClusterSentences) {
+        if (row.workout == workout && row.photos == photos && (workout || row.visit == visit)) {
+            return row.text;
+        }
+    }
+    return kClusterSentences.back().text;
+}
+
+void addDistinct(std::vector<std::string>& texts, const std::optional<std::string>& text) {
+    if (!text || text->empty()) return;
+    if (std::ranges::find(texts, *text) == texts.end()) texts.push_back(*text);
+}
+
+/// What each event that is not a photo occasion is called.
+std::vector<std::string> titles(const KSEventBundle& bundle) {
+    std::vector<std::string> texts;
+    for (const auto& event : bundle.events) {
+        addDistinct(texts, event->workoutType);
+        addDistinct(texts, event->placeName);
+        addDistinct(texts, event->tripTitle);
+        addDistinct(texts, event->suggestedEventTitle);
+        addDistinct(texts, event->mediaTitle);
+        addDistinct(texts, event->itemLinkTitle ? event->itemLinkTitle : event->itemDisplayName);
+    }
+    return texts;
+}
+
+/// The span of what was done; the photos' own, with their margins, only when there is nothing else.
+std::optional<KSDateInterval> mainSpan(const KSEventBundle& bundle) {
+    std::optional<KSDateInterval> span;
+    const bool onlyPhotos = std::ranges::all_of(bundle.events, [](const auto& event) {
+        return event->category() == KSEventCategory::photoKeepsake;
+    });
+    for (const auto& event : bundle.events) {
+        if (!onlyPhotos && event->category() == KSEventCategory::photoKeepsake) continue;
+        if (!span) span = KSDateInterval{event->startDate(), event->endDate()};
+        span->start.seconds = std::min(span->start.seconds, event->startDate().seconds);
+        span->end.seconds = std::max(span->end.seconds, event->endDate().seconds);
+    }
+    return span;
+}
+
+struct PhotoFacts {
+    bool any = false;
+    std::int64_t count = 0;
+    std::string_view subject;
+    std::vector<std::string> people;
+};
+
+PhotoFacts photoFacts(const KSEventBundle& bundle) {
+    PhotoFacts facts;
+    std::vector<std::string> inferences;
+    for (const auto& event : bundle.events) {
+        if (event->category() != KSEventCategory::photoKeepsake) continue;
+        facts.any = true;
+        if (!event->extendedAttributes) continue;
+        const auto& attributes = *event->extendedAttributes;
+        facts.count += attributes.photoCount.value_or(0);
+        const auto& words = attributes.photoKeepsakeInferences;
+        if (words) inferences.insert(inferences.end(), words->begin(), words->end());
+        for (const auto& person :
+             attributes.photoKeepsakePersons.value_or(std::vector<KSPerson>())) {
+            addDistinct(facts.people, person.name);
+        }
+    }
+    for (const auto& subject : kSubjects) {
+        if (std::ranges::find(inferences, subject.key) == inferences.end()) continue;
+        facts.subject = subject.text;
+        break;
+    }
+    return facts;
+}
+
+}  // namespace
+
+std::string promptLanguageOf(const KSEventBundle& bundle) {
+    auto parts = titles(bundle);
+    if (const auto span = mainSpan(bundle)) parts.push_back(timeText(*span));
+    if (const auto photos = photoFacts(bundle); photos.any) {
+        parts.push_back(photosText(photos.count, photos.subject));
+        if (!photos.people.empty()) parts.push_back(peopleText(photos.people));
+    }
+    return fmt::format("{}: {}", headline(bundle), fmt::join(parts, ", "));
+}
+
+}  // namespace keepsakes

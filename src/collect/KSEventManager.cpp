@@ -1,0 +1,319 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "collect/KSEventManager.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <mutex>
+#include <utility>
+
+#include "collect/SourceRouting.h"
+#include "core/Clock.h"
+#include "core/KSAssertion.h"
+#include "core/Log.h"
+#include "core/ResultKeys.h"
+#include "core/TaskGroup.h"
+#include "model/KSExtensions.h"
+#include "platform/DeviceDataIndex.h"
+#include "platform/PlatformServices.h"
+#include "store/KSDefaultsManager.h"
+#include "store/KSEventStore.h"
+#include "store/KSPersistenceManager.h"
+
+namespace keepsakes {
+
+namespace {
+
+constexpr std::string_view kUnit = "KSEventManager";
+constexpr const char* kCollectionStartKey = "EventManagerEventCollectionStartDate";
+
+/// What several branches of one operation report, whichever thread they end on.
+class Tally {
+  public:
+    void add(const OptionalError& error, const KSDictionary& result) {
+        const std::lock_guard lock(mutex_);
+        if (error) lastError_ = error;
+        total_ += valueForKey(result, kResultNumberOfEvents).asInteger().value_or(0);
+        const auto failure = result.find(kSpiPurgeFailure);
+        if (failure != result.end()) result_.insert_or_assign(failure->first, failure->second);
+    }
+
+    void markFailed(std::string_view successKey) {
+        const std::lock_guard lock(mutex_);
+        result_.insert_or_assign(std::string(successKey), false);
+    }
+
+    KSDictionary result() const {
+        const std::lock_guard lock(mutex_);
+        auto result = result_;
+        result.insert_or_assign(std::string(kResultNumberOfEvents), total_);
+        return result;
+    }
+
+    OptionalError lastError() const {
+        const std::lock_guard lock(mutex_);
+        return lastError_;
+    }
+
+  private:
+    mutable std::mutex mutex_;
+    KSDictionary result_;
+    std::int64_t total_ = 0;
+    OptionalError lastError_;
+};
+
+/// The handler's result with the database's state added.
+ResultHandler addingAvailability(ResultHandler handler) {
+    return [handler = std::move(handler)](OptionalError error, KSDictionary result) {
+        result.insert_or_assign(std::string(kStateDatabaseAvailable), true);
+        handler(std::move(error), std::move(result));
+    };
+}
+
+KSEventArray sortedAs(KSEventArray events, bool ascending) {
+    std::ranges::stable_sort(events, [ascending](const auto& a, const auto& b) {
+        return ascending ? a->startDate() < b->startDate() : b->startDate() < a->startDate();
+    });
+    return events;
+}
+
+}  // namespace
+
+KSEventManager::KSEventManager(const PlatformServices& platform,
+                               std::shared_ptr<KSDefaultsManager> defaultsManager,
+                               std::shared_ptr<KSEventStore> eventStore,
+                               std::unique_ptr<EventSources> sources)
+    : platform_(platform),
+      defaultsManager_(std::move(defaultsManager)),
+      eventStore_(std::move(eventStore)),
+      sources_(std::move(sources)),
+      queue_("KSEventManager"),
+      refreshQueue_("KSEventManager.deviceData") {}
+
+KSEventManager::~KSEventManager() = default;
+
+std::shared_ptr<KSEventManager> KSEventManager::initWithUniverse(const ServiceLookup& universe) {
+    auto defaultsManager = universe.service<KSDefaultsManager>("DefaultsManager");
+    auto eventStore = universe.service<KSEventStore>("EventStore");
+    const bool good =
+        assertParameter(eventStore != nullptr, "eventStore", kUnit, __LINE__) &&
+        assertParameter(defaultsManager != nullptr, "defaultsManager", kUnit, __LINE__);
+    if (!good) return nullptr;
+    return std::shared_ptr<KSEventManager>(
+        new KSEventManager(universe.platform(), std::move(defaultsManager), std::move(eventStore),
+                           std::make_unique<EventSources>(universe)));
+}
+
+void KSEventManager::setProgressObserver(ProgressObserver observer) {
+    refreshQueue_.sync([this, &observer] { progressObserver_ = std::move(observer); });
+}
+
+void KSEventManager::whenAvailable(Work work, const ResultHandler& unavailable) {
+    eventStore_->persistenceManager()->checkAvailabilityWithCompletionHandler(
+        [&](bool available, const OptionalError&) {
+            if (available) {
+                queue_.async(std::move(work));
+            } else {
+                unavailable(databaseUnavailableError(),
+                            {{std::string(kStateDatabaseAvailable), false}});
+            }
+        });
+}
+
+void KSEventManager::afterRefresh(std::string_view activity, Work work) {
+    // Not on the manager's queue: fetches are answered while a long scan runs.
+    refreshQueue_.async([this, activity = std::string(activity), work = std::move(work)] {
+        platform_.deviceData->refresh([&](std::uint64_t done, std::uint64_t total) {
+            if (progressObserver_) progressObserver_(activity, done, total);
+        });
+        queue_.async(work);
+    });
+}
+
+void KSEventManager::collectEventsWithHandler(ResultHandler handler) {
+    whenAvailable(
+        [this, handler = addingAvailability(handler)] {
+            eventStore_->persistenceManager()->persistCollectionDate();
+            afterRefresh("collect", [this, handler] { _collectEvents(handler); });
+        },
+        handler);
+}
+
+void KSEventManager::_collectEvents(const ResultHandler& handler) {
+    const KSDate end = platform_.clock->now();
+    const auto chosen = defaultsManager_->objectForKey(kCollectionStartKey).asDate();
+    const KSDate start = chosen && *chosen <= end ? *chosen : end - kDefaultWindowSeconds;
+    _collectEventsBetweenStartDate(start, end, handler);
+}
+
+void KSEventManager::collectEventsBetweenStartDate(KSDate start, KSDate end,
+                                                   ResultHandler handler) {
+    queue_.async([this, start, end, handler = std::move(handler)] {
+        _collectEventsBetweenStartDate(start, end, handler);
+    });
+}
+
+void KSEventManager::_collectEventsBetweenStartDate(KSDate start, KSDate end,
+                                                    const ResultHandler& handler) {
+    const auto tally = std::make_shared<Tally>();
+    for (const auto& step : sources_->collectionSteps()) {
+        Semaphore done;
+        const auto finish = [tally, done, key = step.successKey](const OptionalError& error,
+                                                                 const KSDictionary& result) {
+            if (error) {
+                logWarning(fmt::format("{}: {}", key, error->description()));
+                tally->markFailed(key);
+            } else {
+                tally->add(error, result);
+            }
+            Semaphore(done).signal();
+        };
+        step.fetchAndSave(start, end, finish);
+        if (!platform_.clock->wait(done, kSourceWaitSeconds)) {
+            const auto error = KSError::make(KSErrorCode::waitTimedOut, "semaphore wait timeout");
+            logWarning(fmt::format("{}: {}", step.successKey, error.description()));
+            tally->markFailed(step.successKey);
+        }
+    }
+    handler(std::nullopt, tally->result());
+}
+
+void KSEventManager::storeEvents(KSEventArray events, ResultHandler handler) {
+    whenAvailable(
+        [this, events = std::move(events), handler] { eventStore_->storeEvents(events, handler); },
+        handler);
+}
+
+void KSEventManager::fetchEventsWithOptions(KSEventFetchOptions options, EventsHandler handler) {
+    whenAvailable(
+        [this, options, handler] { _fetchEventsWithOptions(options, handler); },
+        [&handler](const OptionalError& error, const KSDictionary&) { handler({}, error); });
+}
+
+void KSEventManager::_fetchEventsWithOptions(const KSEventFetchOptions& options,
+                                             const EventsHandler& handler) {
+    KSEventArray fetched;
+    OptionalError failed;
+    eventStore_->fetchEventsWithOptions(
+        options, [&fetched, &failed](KSEventArray events, OptionalError error) {
+            fetched = std::move(events);
+            failed = std::move(error);
+        });
+    if (failed) {
+        handler({}, failed);
+        return;
+    }
+    // The groups come back one behind the other; the caller asked for an order.
+    _rehydrateEvents(fetched, [handler, ascending = options.ascending](KSEventArray events,
+                                                                       OptionalError error) {
+        handler(sortedAs(std::move(events), ascending), std::move(error));
+    });
+}
+
+void KSEventManager::rehydrateEvents(KSEventArray events, EventsHandler handler) {
+    queue_.async([this, events = std::move(events), handler = std::move(handler)] {
+        _rehydrateEvents(events, handler);
+    });
+}
+
+void KSEventManager::_rehydrateEvents(const KSEventArray& events, EventsHandler handler) {
+    struct Groups {
+        std::mutex mutex;
+        EventGroups byKey;
+    };
+    const auto rehydrated = std::make_shared<Groups>();
+    const auto group = TaskGroup::create();
+    for (const auto& [key, members] : splitEventArrayByCategory(events)) {
+        group->enter();
+        sources_->_rehydrateEventsBySingleSource(
+            members, [rehydrated, group, key](KSEventArray filled, const OptionalError& error) {
+                if (error) logWarning(fmt::format("{}: {}", key, error->description()));
+                {
+                    const std::lock_guard lock(rehydrated->mutex);
+                    rehydrated->byKey.insert_or_assign(key, std::move(filled));
+                }
+                group->leave();
+            });
+    }
+    group->notify(queue_, [rehydrated, handler = std::move(handler)] {
+        handler(mergeEventArraysFromDict(rehydrated->byKey), std::nullopt);
+    });
+}
+
+void KSEventManager::cleanUpEventsWithHandler(ResultHandler handler) {
+    whenAvailable(
+        [this, handler = addingAvailability(handler)] {
+            afterRefresh("purge", [this, handler] { _cleanUpEvents(handler); });
+        },
+        handler);
+}
+
+void KSEventManager::_cleanUpEvents(const ResultHandler& handler) {
+    const auto tally = std::make_shared<Tally>();
+    const auto group = TaskGroup::create();
+    const auto finish = [tally, group](const OptionalError& error, const KSDictionary& result) {
+        tally->add(error, result);
+        group->leave();
+    };
+    group->enter();
+    eventStore_->purgeExpiredEvents(finish);
+    group->enter();
+    eventStore_->purgeUnknownEvents(finish);
+    group->enter();
+    _purgeEventsDeletedAtSources(finish);
+    group->notify(queue_, [tally, handler] { handler(tally->lastError(), tally->result()); });
+}
+
+void KSEventManager::_purgeEventsDeletedAtSources(ResultHandler handler) {
+    KSEventArray stored;
+    const auto tally = std::make_shared<Tally>();
+    eventStore_->fetchAllEvents([&stored, &tally](KSEventArray events, const OptionalError& error) {
+        stored = std::move(events);
+        tally->add(error, {});
+    });
+    const auto group = TaskGroup::create();
+    for (const auto& [key, members] : splitEventArrayByCategory(stored)) {
+        group->enter();
+        sources_->_purgeEventsDeletedAtSingleSource(
+            members, [tally, group](const OptionalError& error, const KSDictionary& result) {
+                tally->add(error, result);
+                group->leave();
+            });
+    }
+    group->notify(queue_, [tally, handler = std::move(handler)] {
+        handler(tally->lastError(), tally->result());
+    });
+}
+
+void KSEventManager::clearEventsWithHandler(ResultHandler handler) {
+    whenAvailable([this, handler] { eventStore_->removeAllEvents(handler); }, handler);
+}
+
+void KSEventManager::runAnalyticsWithHandler(ResultHandler handler) {
+    whenAvailable(
+        [handler] {
+            handler(KSError::make(KSErrorCode::analyticsPlansUnavailable,
+                                  "Analytics Plans are not avaialble"),
+                    {});
+        },
+        handler);
+}
+
+KSEventManager::EventGroups KSEventManager::splitEventArrayByCategory(const KSEventArray& events) {
+    EventGroups groups;
+    for (const auto& event : events) {
+        groups[fmt::format("{}:{}", event->describeCategory(), event->describeProvider())]
+            .push_back(event);
+    }
+    return groups;
+}
+
+KSEventArray KSEventManager::mergeEventArraysFromDict(const EventGroups& groups) {
+    KSEventArray merged;
+    for (const auto& [key, members] : groups) {
+        merged.insert(merged.end(), members.begin(), members.end());
+    }
+    return merged;
+}
+
+}  // namespace keepsakes

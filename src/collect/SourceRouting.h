@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string_view>
+#include <vector>
+
+#include "core/KSError.h"
+#include "core/ServiceLookup.h"
+#include "model/KSEvent.h"
+
+namespace keepsakes {
+
+class KSPhotoManager;
+class KSVitalsManager;
+
+/// One source's part of a collection.
+struct CollectionStep {
+    std::string_view successKey;  ///< Set to false in the result when the source fails.
+    std::function<void(KSDate start, KSDate end, ResultHandler)> fetchAndSave;
+};
+
+/// The registered sources, and which of their operations an event belongs to. Owned by the event
+/// manager; its operations may be called from any thread.
+class EventSources {
+  public:
+    using EventsHandler = std::function<void(KSEventArray, OptionalError)>;
+
+    explicit EventSources(const ServiceLookup& universe);
+
+    /// In the order of collection.
+    const std::vector<CollectionStep>& collectionSteps() const { return steps_; }
+
+    /// Removes from the store what a group's source no longer has; a group without a source that
+    /// can tell is left alone.
+    void _purgeEventsDeletedAtSingleSource(const KSEventArray& group, ResultHandler handler) const;
+
+    /// Fills a group in again from its source; a group without one comes back as it is.
+    void _rehydrateEventsBySingleSource(const KSEventArray& group, EventsHandler handler) const;
+
+  private:
+    std::shared_ptr<KSVitalsManager> vitalsManager_;
+    std::shared_ptr<KSPhotoManager> photoManager_;
+    std::vector<CollectionStep> steps_;
+};
+
+}  // namespace keepsakes
