@@ -23,6 +23,7 @@ CREATE TABLE files(
     reason TEXT,
     refusedAt REAL,
     PRIMARY KEY(folder, name)) WITHOUT ROWID;
+CREATE UNIQUE INDEX filesById ON files(id);
 CREATE INDEX filesRefused ON files(refusedAt) WHERE refusedAt IS NOT NULL;
 CREATE TABLE workouts(
     file INTEGER NOT NULL, start REAL NOT NULL, end REAL NOT NULL, type INTEGER NOT NULL);
