@@ -125,6 +125,8 @@ int scan(const Arguments& arguments, FileReader& reader) {
     auto readable = options.tracks;
     readable.insert(readable.end(), options.photos.begin(), options.photos.end());
     confineProcess(readable, {folder});
+    // People read of each problem in the report.
+    if (!arguments.json) setLogLevel(LogLevel::error);
     const auto reporter = arguments.json ? makeJsonReporter() : makeHumanReporter();
     if (const auto error = scanFolders(options, reader, **mark, *reporter)) {
         logError(error->description());
