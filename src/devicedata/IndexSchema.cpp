@@ -1,0 +1,57 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "devicedata/IndexSchema.h"
+
+namespace keepsakes {
+
+std::string_view indexSchema() {
+    // Instants are seconds since 2001-01-01 UTC, positions degrees. Paths and names are bytes, for
+    // nothing says that they are text. A file row stands in its folder's order, so that a rescan
+    // reads a folder's rows in one sweep; records refer to it by its number, which a rename keeps.
+    return R"sql(
+CREATE TABLE meta(key TEXT PRIMARY KEY, value) WITHOUT ROWID;
+CREATE TABLE folders(id INTEGER PRIMARY KEY, path BLOB NOT NULL UNIQUE);
+CREATE TABLE files(
+    folder INTEGER NOT NULL,
+    name BLOB NOT NULL,
+    id INTEGER NOT NULL,
+    size INTEGER NOT NULL,
+    mtime INTEGER NOT NULL,
+    inode INTEGER NOT NULL,
+    wanted INTEGER NOT NULL,
+    state INTEGER NOT NULL,
+    hash BLOB,
+    reason TEXT,
+    refusedAt REAL,
+    PRIMARY KEY(folder, name)) WITHOUT ROWID;
+CREATE UNIQUE INDEX filesById ON files(id);
+CREATE INDEX filesRefused ON files(refusedAt) WHERE refusedAt IS NOT NULL;
+CREATE TABLE workouts(
+    file INTEGER NOT NULL, start REAL NOT NULL, end REAL NOT NULL, type INTEGER NOT NULL);
+CREATE INDEX workoutsByEnd ON workouts(end);
+CREATE INDEX workoutsByFile ON workouts(file);
+CREATE TABLE zones(
+    file INTEGER NOT NULL, start REAL NOT NULL, end REAL NOT NULL, offset INTEGER NOT NULL);
+CREATE INDEX zonesByFile ON zones(file);
+CREATE TABLE photos(
+    file INTEGER NOT NULL,
+    number INTEGER NOT NULL,
+    taken REAL NOT NULL,
+    timeSource INTEGER NOT NULL,
+    localTime REAL NOT NULL,
+    latitude REAL,
+    longitude REAL,
+    words TEXT,
+    occasion INTEGER,
+    PRIMARY KEY(file, number)) WITHOUT ROWID;
+CREATE TABLE occasions(
+    id INTEGER PRIMARY KEY,
+    identifier TEXT NOT NULL UNIQUE,
+    start REAL NOT NULL,
+    end REAL NOT NULL,
+    photos INTEGER NOT NULL,
+    content TEXT NOT NULL);
+CREATE INDEX occasionsByStart ON occasions(start);
+)sql";
+}
+
+}  // namespace keepsakes

@@ -1,0 +1,385 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "indexer/FolderScan.h"
+
+#include <fcntl.h>
+#include <fmt/format.h>
+#include <sqlite3.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cctype>
+#include <cerrno>
+#include <chrono>
+#include <new>
+#include <system_error>
+
+#include "core/Log.h"
+#include "indexer/ContentHash.h"
+#include "indexer/FolderListing.h"
+#include "indexer/FolderWalk.h"
+#include "indexer/IndexWriter.h"
+#include "indexer/OccasionUpdate.h"
+
+namespace keepsakes {
+
+namespace {
+
+using Steady = std::chrono::steady_clock;
+
+/// Stands for the time of change of a file that could not be opened, so that it is tried again: its
+/// permissions may change without the file's doing so.
+constexpr std::int64_t kTryAgain = -1;
+
+double secondsSince(Steady::time_point then) {
+    return std::chrono::duration<double>(Steady::now() - then).count();
+}
+
+class OpenFile {
+ public:
+    explicit OpenFile(const std::string& path)
+        // Without O_NONBLOCK, a pipe that took the file's place would be waited for.
+        : fd_(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK)),
+          error_(fd_ < 0 ? errno : 0) {}
+    ~OpenFile() {
+        if (fd_ >= 0) ::close(fd_);
+    }
+    OpenFile(const OpenFile&) = delete;
+    OpenFile& operator=(const OpenFile&) = delete;
+
+    int get() const { return fd_; }
+    int error() const { return error_; }
+
+    std::optional<FileStamp> stamp() const {
+        struct stat info{};
+        if (fd_ < 0 || ::fstat(fd_, &info) != 0 || !S_ISREG(info.st_mode)) return std::nullopt;
+        return FileStamp{
+            .size = info.st_size,
+            .mtime = std::int64_t{info.st_mtim.tv_sec} * 1'000'000'000 + info.st_mtim.tv_nsec,
+            .inode = static_cast<std::int64_t>(info.st_ino)};
+    }
+
+ private:
+    int fd_;
+    int error_;
+};
+
+/// Whether the owner would take a file of this name for a track or a photo, so that its content's
+/// being neither is worth a word. What a file is, its content tells.
+bool promises(std::string_view name, int wanted) {
+    static constexpr std::array<std::string_view, 2> kTracks{".gpx", ".tcx"};
+    static constexpr std::array<std::string_view, 5> kPhotos{".jpg", ".jpeg", ".png", ".heic",
+                                                             ".heif"};
+    const auto dot = name.rfind('.');
+    if (dot == std::string_view::npos) return false;
+    std::string extension(name.substr(dot));
+    for (char& c : extension) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+    return ((wanted & kWantsTracks) != 0 && std::ranges::find(kTracks, extension) != kTracks.end()) ||
+           ((wanted & kWantsPhotos) != 0 && std::ranges::find(kPhotos, extension) != kPhotos.end());
+}
+
+struct Refusal {
+    RefusalReason reason;
+    std::string text;
+};
+
+/// What reading one file came to.
+struct ReadOutcome {
+    FileStamp stamp;
+    std::string hash{};
+    std::optional<FileRecords> records{};  ///< None: of another kind, or refused.
+    std::optional<Refusal> refusal{};
+    bool isGone = false;
+};
+
+class Scan {
+ public:
+    Scan(const ScanOptions& options, FileReader& reader, ReadMark& mark, ScanReporter& reporter)
+        : options_(options),
+          reader_(reader),
+          mark_(mark),
+          reporter_(reporter),
+          index_(options.index) {}
+
+    void run() {
+        changes_ = compareFolders(index_, searchedFolders(), [this] { tell(0, 0); });
+        condemnMarked();
+        moveRenamed();
+        removeVanished();
+        commit();
+        formOccasions();
+        readChanged();
+        formOccasions();
+        if (summary_.changed) {
+            index_.removeEmptyFolders();
+            commit();
+            index_.tidy();
+        }
+        reportAll();
+    }
+
+ private:
+    std::vector<SearchedFolder> searchedFolders() const {
+        std::vector<SearchedFolder> folders;
+        const auto add = [&folders](const std::filesystem::path& path, int wanted) {
+            auto text = std::filesystem::absolute(path).lexically_normal().string();
+            while (text.size() > 1 && text.ends_with('/')) text.pop_back();
+            const auto same = std::ranges::find(folders, text, &SearchedFolder::path);
+            if (same == folders.end()) {
+                folders.push_back({.path = std::move(text), .wanted = wanted});
+            } else {
+                same->wanted |= wanted;
+            }
+        };
+        for (const auto& path : options_.tracks) add(path, kWantsTracks);
+        for (const auto& path : options_.photos) add(path, kWantsPhotos);
+        return folders;
+    }
+
+    std::string pathOf(const ChangedFile& file) const {
+        const auto& folder = changes_.folders[file.folder];
+        return (folder == "/" ? "" : folder) + "/" + file.name;
+    }
+
+    void tell(std::uint64_t done, std::uint64_t total) {
+        if (secondsSince(told_) < 0.25) return;
+        told_ = Steady::now();
+        reporter_.progress(done, total);
+    }
+
+    /// Passes over the file that an earlier scan died of, unless it changed since.
+    void condemnMarked() {
+        const auto& left = mark_.leftBehind();
+        if (!left) return;
+        const auto found = std::ranges::find_if(changes_.changed, [this, &left](const auto& file) {
+            return file.stamp == left->stamp && pathOf(file) == left->path;
+        });
+        if (found != changes_.changed.end()) {
+            ReadOutcome outcome{.stamp = found->stamp};
+            outcome.refusal =
+                left->outOfTime
+                    ? Refusal{RefusalReason::outOfTime, "reading it took too long"}
+                    : Refusal{RefusalReason::endedIndexer, "it ended the indexer that read it"};
+            store(*found, outcome, FileState::condemned);
+            changes_.changed.erase(found);
+        }
+        commit();
+        mark_.end();
+    }
+
+    /// Gives a changed path the records of a vanished file of the same content.
+    void moveRenamed() {
+        std::unordered_multimap<std::int64_t, std::size_t> bySize;
+        for (std::size_t i = 0; i < changes_.vanished.size(); ++i) {
+            const auto& file = changes_.vanished[i].file;
+            if (!file.hash.empty()) bySize.emplace(file.stamp.size, i);
+        }
+        if (bySize.empty()) return;
+        std::erase_if(changes_.changed, [this, &bySize](const ChangedFile& file) {
+            if (!bySize.contains(file.stamp.size)) return false;
+            const auto path = pathOf(file);
+            mark_.begin(path, file.stamp);
+            const OpenFile open(path);
+            const auto stamp = open.stamp();
+            const auto hash = stamp ? contentHash(open.get(), stamp->size) : std::nullopt;
+            mark_.end();
+            if (!hash || stamp != file.stamp) return false;
+            const auto [first, last] = bySize.equal_range(stamp->size);
+            const auto same = std::find_if(first, last, [this, &hash, &file](const auto& entry) {
+                const auto& known = changes_.vanished[entry.second].file;
+                return known.hash == *hash && known.wanted == file.wanted;
+            });
+            if (same == last) return false;
+            move(changes_.vanished[same->second], file);
+            bySize.erase(same);
+            return true;
+        });
+    }
+
+    void move(VanishedFile& from, const ChangedFile& to) {
+        if (to.knownId != 0) index_.removeRecords(to.knownId);
+        index_.removeFile(from.folder, from.name);
+        from.file.stamp = to.stamp;
+        index_.putFile(index_.folderId(changes_.folders[to.folder]), to.name, from.file);
+        from.file.id = 0;  // Gone on under its new name.
+        ++summary_.renamed;
+        changed();
+    }
+
+    void removeVanished() {
+        for (const auto& vanished : changes_.vanished) {
+            if (vanished.file.id == 0) continue;
+            index_.removeRecords(vanished.file.id);
+            index_.removeFile(vanished.folder, vanished.name);
+            ++summary_.removed;
+            changed();
+        }
+        changes_.vanished = {};
+    }
+
+    void readChanged() {
+        auto& files = changes_.changed;
+        std::ranges::stable_sort(files, std::ranges::greater{},
+                                 [](const ChangedFile& file) { return file.stamp.mtime; });
+        for (std::size_t i = 0; i < files.size(); ++i) {
+            tell(i, files.size());
+            const auto outcome = read(files[i]);
+            if (outcome.isGone) {
+                forget(files[i]);
+            } else {
+                store(files[i], outcome, FileState::refused);
+            }
+            ++summary_.read;
+            if (secondsSince(occasionsFormed_) > kSecondsPerOccasions) formOccasions();
+        }
+        if (!files.empty()) {
+            told_ = {};
+            tell(files.size(), files.size());
+        }
+    }
+
+    ReadOutcome read(const ChangedFile& file) {
+        ReadOutcome outcome{.stamp = file.stamp};
+        const auto path = pathOf(file);
+        mark_.begin(path, file.stamp);
+        const OpenFile open(path);
+        if (const auto stamp = open.stamp()) {
+            outcome.stamp = *stamp;
+            readOpen(open.get(), file, outcome);
+        } else if (open.error() == 0 || open.error() == ENOENT || open.error() == ELOOP ||
+                   open.error() == ENOTDIR) {
+            outcome.isGone = true;
+        } else {
+            outcome.stamp.mtime = kTryAgain;
+            outcome.refusal = {RefusalReason::unreadable,
+                               std::generic_category().message(open.error())};
+        }
+        mark_.end();
+        return outcome;
+    }
+
+    void readOpen(int fd, const ChangedFile& file, ReadOutcome& outcome) {
+        try {
+            outcome.hash = contentHash(fd, outcome.stamp.size).value_or("");
+            auto records = reader_.read(fd, file.wanted, options_.now);
+            if (!records) {
+                outcome.refusal = {RefusalReason::damaged, std::move(records.error())};
+            } else if (*records) {
+                outcome.records = std::move(**records);
+            } else if (promises(file.name, file.wanted)) {
+                outcome.refusal = {RefusalReason::wrongContent,
+                                   "its content is not what its name says"};
+            }
+        } catch (const std::bad_alloc&) {
+            outcome.refusal = {RefusalReason::outOfMemory, "reading it takes too much memory"};
+        } catch (const std::exception& error) {
+            outcome.refusal = {RefusalReason::damaged, error.what()};
+        }
+    }
+
+    void store(const ChangedFile& file, const ReadOutcome& outcome, FileState refusedState) {
+        IndexedFile row{.id = file.knownId != 0 ? file.knownId : index_.newFileId(),
+                        .stamp = outcome.stamp,
+                        .wanted = file.wanted,
+                        .state = outcome.records ? FileState::read : FileState::foreign,
+                        .hash = outcome.hash,
+                        .reason = std::nullopt,
+                        .refusedAt = options_.now};
+        if (outcome.refusal) {
+            row.state = refusedState;
+            row.reason = printable(outcome.refusal->text);
+            ++summary_.refused[outcome.refusal->reason];
+            if (row.reason != file.knownReason) {
+                logWarning(fmt::format("passed over {}: {}", printable(pathOf(file)), *row.reason));
+            }
+        }
+        if (outcome.records) {
+            index_.putRecords(row.id, *outcome.records);
+        } else if (file.knownId != 0) {
+            index_.removeRecords(row.id);
+        }
+        index_.putFile(index_.folderId(changes_.folders[file.folder]), file.name, row);
+        changed();
+    }
+
+    void forget(const ChangedFile& file) {
+        if (file.knownId == 0) return;
+        index_.removeRecords(file.knownId);
+        index_.removeFile(index_.folderId(changes_.folders[file.folder]), file.name);
+        changed();
+    }
+
+    void changed() {
+        summary_.changed = true;
+        if (++uncommitted_ >= kFilesPerCommit || secondsSince(committed_) > kSecondsPerCommit) {
+            commit();
+        }
+    }
+
+    void commit() {
+        index_.commit(options_.now);
+        uncommitted_ = 0;
+        committed_ = Steady::now();
+    }
+
+    void formOccasions() {
+        occasionsFormed_ = Steady::now();
+        if (!index_.occasionsStale()) return;
+        updateOccasions(index_);
+        // A scan that died before this left it to be done.
+        summary_.changed = true;
+        commit();
+    }
+
+    void reportAll() {
+        summary_.totals = index_.totals();
+        auto refused = index_.refusedFiles(kMostProblems);
+        std::ranges::reverse(refused);
+        for (const auto& file : refused) {
+            reporter_.problem(
+                fmt::format("passed over {}: {}", printable(file.path), file.reason));
+        }
+        for (const auto& problem : changes_.problems) {
+            logWarning(problem);
+            reporter_.problem(problem);
+        }
+        reporter_.report(summary_);
+    }
+
+    const ScanOptions& options_;
+    FileReader& reader_;
+    ReadMark& mark_;
+    ScanReporter& reporter_;
+    IndexWriter index_;
+    FolderChanges changes_;
+    ScanSummary summary_;
+    std::size_t uncommitted_ = 0;
+    Steady::time_point committed_ = Steady::now();
+    Steady::time_point occasionsFormed_ = Steady::now();
+    Steady::time_point told_;
+};
+
+}  // namespace
+
+OptionalError scanFolders(const ScanOptions& options, FileReader& reader, ReadMark& mark,
+                          ScanReporter& reporter) {
+    for (bool isSecond = false;; isSecond = true) {
+        try {
+            Scan(options, reader, mark, reporter).run();
+            return std::nullopt;
+        } catch (const SQLite::Exception& error) {
+            const bool isDamaged =
+                error.getErrorCode() == SQLITE_CORRUPT || error.getErrorCode() == SQLITE_NOTADB;
+            if (!isDamaged || isSecond) {
+                return KSError::make(
+                    kSQLiteErrorDomain, error.getExtendedErrorCode(),
+                    fmt::format("write {}: {}", printable(options.index.string()), error.what()));
+            }
+            logWarning(fmt::format("the index is damaged ({}): it is built anew", error.what()));
+        }
+        IndexWriter::remove(options.index);
+    }
+}
+
+}  // namespace keepsakes

@@ -1,0 +1,47 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "core/KSDate.h"
+#include "core/KSError.h"
+#include "indexer/FileReader.h"
+#include "indexer/ReadMark.h"
+#include "indexer/ScanReporter.h"
+
+namespace keepsakes {
+
+// Bounds of a scan.
+
+/// Folders within folders; what lies deeper is passed over and reported.
+inline constexpr std::size_t kDeepestFolder = 128;
+/// Pending changes are committed after so many files or seconds: a crash costs no more.
+inline constexpr std::size_t kFilesPerCommit = 128;
+inline constexpr double kSecondsPerCommit = 1;
+/// While a long scan runs, occasions are formed so often that the owner sees the newest ones.
+inline constexpr double kSecondsPerOccasions = 30;
+/// Problem lines of one scan.
+inline constexpr std::size_t kMostProblems = 50;
+
+struct ScanOptions {
+    std::filesystem::path index;
+    std::vector<std::filesystem::path> tracks;  ///< Folders searched for tracks.
+    std::vector<std::filesystem::path> photos;  ///< Folders searched for photos.
+    KSDate now;
+};
+
+/// Brings the index up to date with the owner's folders: stats every file, reads those that are
+/// new or changed (newest first), drops the records of those that are gone, carries the records of
+/// a moved file to its new path, and forms the occasions anew where photos changed.
+///
+/// A folder that is configured and cannot be listed keeps its records: a disk that is not mounted
+/// is no deletion. Symbolic links inside the folders are not followed. The file on `mark` is passed
+/// over until it changes. Blocks until done. An index that turns out to be damaged is built anew
+/// once; any other failure of the database is the answer, and what was committed stays.
+OptionalError scanFolders(const ScanOptions& options, FileReader& reader, ReadMark& mark,
+                          ScanReporter& reporter);
+
+}  // namespace keepsakes

@@ -1,0 +1,156 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "indexer/IndexerMain.h"
+
+#include <fmt/format.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <charconv>
+#include <chrono>
+#include <clocale>
+#include <cstdlib>
+#include <expected>
+#include <span>
+#include <string_view>
+
+#include "core/Calendar.h"
+#include "core/Files.h"
+#include "core/Log.h"
+#include "indexer/FolderScan.h"
+#include "indexer/Sandbox.h"
+#include "indexer/ScanReporter.h"
+
+namespace keepsakes {
+
+namespace {
+
+constexpr int kFailed = 1;
+constexpr int kUsage = 2;
+constexpr int kBusy = 3;
+
+constexpr const char* kHelp =
+    "usage: keepsakes-indexer [--index FILE] [--tracks FOLDER...] [--photos FOLDER...]\n"
+    "                         [--now SECONDS] [--seconds-per-file N] [--json | --human]\n"
+    "Scans the folders once and brings the index up to date.\n"
+    "  --index    the index; otherwise the daemon's, in the user's cache folder\n"
+    "  --now      the time to take for now, in seconds since 2001-01-01 UTC\n"
+    "  --json     one JSON object a line on standard output\n"
+    "  --human    sentences for people; the default on a terminal\n";
+
+struct Arguments {
+    ScanOptions scan;
+    unsigned secondsPerFile = ReadMark::kSecondsPerFile;
+    bool json = ::isatty(STDOUT_FILENO) != 1;
+    bool help = false;
+};
+
+KSDate systemNow() {
+    return KSDate::fromUnix(std::chrono::duration<double>(
+                                std::chrono::system_clock::now().time_since_epoch())
+                                .count());
+}
+
+std::filesystem::path defaultIndex() {
+    const char* cache = std::getenv("XDG_CACHE_HOME");
+    const char* home = std::getenv("HOME");
+    std::filesystem::path folder;
+    if (cache && *cache == '/') {
+        folder = cache;
+    } else if (home) {
+        folder = std::filesystem::path(home) / ".cache";
+    }
+    return folder.empty() ? folder : folder / "com.brindle.keepsakesd" / "deviceData.sqlite";
+}
+
+template <class T>
+bool parseNumber(std::string_view text, T& number) {
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    return error == std::errc() && end == text.data() + text.size();
+}
+
+/// Why the arguments cannot be taken, or nothing.
+std::optional<std::string> parse(std::span<char*> words, Arguments& arguments) {
+    std::size_t i = 0;
+    const auto isOption = [](std::string_view word) { return word.starts_with("--"); };
+    const auto value = [&words, &i]() -> std::optional<std::string_view> {
+        return i < words.size() ? std::optional<std::string_view>(words[i++]) : std::nullopt;
+    };
+    while (i < words.size()) {
+        const std::string_view option(words[i++]);
+        if (option == "--tracks" || option == "--photos") {
+            auto& folders = option == "--tracks" ? arguments.scan.tracks : arguments.scan.photos;
+            while (i < words.size() && !isOption(words[i])) folders.emplace_back(words[i++]);
+        } else if (option == "--index") {
+            const auto path = value();
+            if (!path) return "--index needs a file";
+            arguments.scan.index = *path;
+        } else if (option == "--now") {
+            const auto text = value();
+            if (!text || !parseNumber(*text, arguments.scan.now.seconds)) {
+                return "--now needs seconds since 2001-01-01 UTC";
+            }
+        } else if (option == "--seconds-per-file") {
+            const auto text = value();
+            if (!text || !parseNumber(*text, arguments.secondsPerFile) ||
+                arguments.secondsPerFile == 0) {
+                return "--seconds-per-file needs a number above 0";
+            }
+        } else if (option == "--json" || option == "--human") {
+            arguments.json = option == "--json";
+        } else if (option == "--help") {
+            arguments.help = true;
+        } else {
+            return fmt::format("what is {}?", option);
+        }
+    }
+    if (arguments.scan.index.empty()) arguments.scan.index = defaultIndex();
+    if (arguments.scan.index.empty()) return "no --index, and no home folder to look in";
+    return std::nullopt;
+}
+
+int scan(const Arguments& arguments, FileReader& reader) {
+    const auto& options = arguments.scan;
+    const auto folder = std::filesystem::absolute(options.index).parent_path();
+    if (const auto error = makePrivateFolder(folder)) {
+        logError(error->description());
+        return kFailed;
+    }
+    const auto mark = ReadMark::take(options.index.string() + ".scan", arguments.secondsPerFile);
+    if (!mark) {
+        logError(mark.error());
+        return kBusy;
+    }
+    // Loads the owner's zone while its file can be read.
+    calendar::offsetAt(options.now);
+    auto readable = options.tracks;
+    readable.insert(readable.end(), options.photos.begin(), options.photos.end());
+    confineProcess(readable, {folder});
+    // People read of each problem in the report.
+    if (!arguments.json) setLogLevel(LogLevel::error);
+    const auto reporter = arguments.json ? makeJsonReporter() : makeHumanReporter();
+    if (const auto error = scanFolders(options, reader, **mark, *reporter)) {
+        logError(error->description());
+        return kFailed;
+    }
+    return 0;
+}
+
+}  // namespace
+
+int runIndexer(int argc, char** argv, FileReader& reader) {
+    ::umask(077);
+    Arguments arguments;
+    arguments.scan.now = systemNow();
+    if (const auto error =
+            parse({argv + 1, static_cast<std::size_t>(argc > 0 ? argc - 1 : 0)}, arguments)) {
+        fmt::print(stderr, "keepsakes-indexer: {}\n{}", *error, kHelp);
+        return kUsage;
+    }
+    if (arguments.help) {
+        fmt::print("{}", kHelp);
+        return 0;
+    }
+    return scan(arguments, reader);
+}
+
+}  // namespace keepsakes

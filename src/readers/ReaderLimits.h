@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+
+#include "core/KSDate.h"
+
+namespace keepsakes::limits {
+
+// Time.
+
+/// 1990-01-01: no receiver or camera recorded a true time before it; clocks that were never set
+/// show the years 1970 and 1980.
+inline constexpr KSDate kEarliestTime = KSDate::fromUnix(631152000);
+/// How far after now a time is still believed, in seconds: clocks and zones differ, by a day at
+/// most.
+inline constexpr double kFutureTolerance = 86400;
+/// Local time is between so many seconds behind and ahead of UTC anywhere.
+inline constexpr int kLowestOffset = -12 * 3600;
+inline constexpr int kHighestOffset = 14 * 3600;
+
+inline constexpr bool isSane(KSDate time, KSDate now) {
+    return time >= kEarliestTime && time <= now + kFutureTolerance;
+}
+inline constexpr bool isOffset(int seconds) {
+    return seconds >= kLowestOffset && seconds <= kHighestOffset;
+}
+
+// XML.
+
+/// Bytes per read.
+inline constexpr std::size_t kBlockSize = std::size_t{64} * 1024;
+/// A single tag, comment or the like may be so long. The parser looks at an unfinished one again
+/// with each block, so that a longer one would cost its length squared.
+inline constexpr std::size_t kLongestToken = std::size_t{1024} * 1024;
+/// Elements within elements.
+inline constexpr std::size_t kDeepestElement = 64;
+/// The values read (times, numbers, types) are short; a longer text is no such value.
+inline constexpr std::size_t kLongestValue = 256;
+
+// Tracks.
+
+/// Workouts, and spans of a known zone, that one file may hold.
+inline constexpr std::size_t kMostWorkouts = 10000;
+inline constexpr std::size_t kMostZoneSpans = 10000;
+/// A track that spans more seconds than 31 days holds a wrong timestamp or is no workout.
+inline constexpr double kLongestWorkout = 31 * 86400.0;
+
+// Photos.
+
+inline constexpr std::uint64_t kLargestPhoto = std::uint64_t{256} * 1024 * 1024;
+/// How far, in seconds, the camera's clock may be from a multiple of 15 minutes off GPS time for
+/// the zone to be told from it. Beyond it the clock is wrong or the fix is an old one.
+inline constexpr double kLargestClockError = 180;
+/// Properties of a photo looked at, and names taken from it.
+inline constexpr std::size_t kMostProperties = 10000;
+inline constexpr std::size_t kMostNames = 100;
+/// Bytes of a keyword or a name; a longer one is passed over.
+inline constexpr std::size_t kLongestName = 256;
+
+}  // namespace keepsakes::limits

@@ -1,0 +1,23 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace keepsakes {
+
+/// The key under which the tables of words are searched: case and accents folded away (Unicode
+/// compatibility case folding, then no combining marks), and everything that is neither a letter
+/// nor a digit left out. "Trail_Running", "trail running" and "TRAIL-RUNNING" share a key, as do
+/// "Châteaux" and "chateaux", "Strasse" and "Straße".
+std::string foldWord(std::string_view utf8);
+
+/// The keys of words that stand apart by blanks (a blank within a word is written as a hyphen).
+std::vector<std::string> foldedWords(std::string_view words);
+
+/// The text as valid UTF-8 without control characters and outer blanks. Bytes that are no UTF-8 are
+/// taken for windows-1252, which old cameras and editors write.
+std::string cleanText(std::string_view bytes);
+
+}  // namespace keepsakes
