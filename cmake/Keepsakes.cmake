@@ -27,6 +27,7 @@ pkg_check_modules(TOMLPLUSPLUS REQUIRED IMPORTED_TARGET tomlplusplus)
 
 add_library(keepsakes_options INTERFACE)
 target_compile_features(keepsakes_options INTERFACE cxx_std_23)
+target_compile_definitions(keepsakes_options INTERFACE KEEPSAKES_VERSION="${PROJECT_VERSION}")
 target_compile_options(keepsakes_options INTERFACE
     -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor
     -Woverloaded-virtual -Wold-style-cast -Werror

@@ -104,12 +104,16 @@ std::shared_ptr<KSEventManager> KSEventManager::initWithUniverse(const ServiceLo
                            std::make_unique<EventSources>(universe)));
 }
 
+const std::shared_ptr<KSPersistenceManager>& KSEventManager::persistenceManager() const {
+    return eventStore_->persistenceManager();
+}
+
 void KSEventManager::setProgressObserver(ProgressObserver observer) {
     refreshQueue_.sync([this, &observer] { progressObserver_ = std::move(observer); });
 }
 
 void KSEventManager::whenAvailable(Work work, const ResultHandler& unavailable) {
-    eventStore_->persistenceManager()->checkAvailabilityWithCompletionHandler(
+    persistenceManager()->checkAvailabilityWithCompletionHandler(
         [&](bool available, const OptionalError&) {
             if (available) {
                 queue_.async(std::move(work));
@@ -133,7 +137,7 @@ void KSEventManager::afterRefresh(std::string_view activity, Work work) {
 void KSEventManager::collectEventsWithHandler(ResultHandler handler) {
     whenAvailable(
         [this, handler = addingAvailability(handler)] {
-            eventStore_->persistenceManager()->persistCollectionDate();
+            persistenceManager()->persistCollectionDate();
             afterRefresh("collect", [this, handler] { _collectEvents(handler); });
         },
         handler);

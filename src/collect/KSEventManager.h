@@ -17,6 +17,7 @@ namespace keepsakes {
 class EventSources;
 class KSDefaultsManager;
 class KSEventStore;
+class KSPersistenceManager;
 struct PlatformServices;
 
 /// The collection pipeline: asks each source in turn to fetch and save a window's events, cleans
@@ -61,7 +62,7 @@ class KSEventManager final : public KSService {
     static EventGroups splitEventArrayByCategory(const KSEventArray& events);
     static KSEventArray mergeEventArraysFromDict(const EventGroups& groups);
 
-    const std::shared_ptr<KSEventStore>& eventStore() const { return eventStore_; }
+    const std::shared_ptr<KSPersistenceManager>& persistenceManager() const;
 
   private:
     KSEventManager(const PlatformServices& platform,

@@ -17,8 +17,17 @@ class PhotoAnalysis;
 class Problems;
 class UserDefaults;
 
+/// What the daemon may do by itself; fixed at start by the owner's diagnostics policy.
+struct FeatureSwitches {
+    bool collectEnabled = true;
+    bool computeEnabled = true;
+    bool purgeEnabled = true;
+    bool anyEnabled = true;
+};
+
 /// Everything that the daemon needs from the device it runs on, put together by the composition
-/// root. None is null; all outlive the services.
+/// root. None is null but the
+/// listener, which a daemon without clients has none of; all outlive the services.
 struct PlatformServices {
     Clock* clock = nullptr;
     DevicePolicy* devicePolicy = nullptr;
@@ -32,6 +41,7 @@ struct PlatformServices {
     Problems* problems = nullptr;
     /// The daemon's folder for the database and its property lists; made when missing.
     std::filesystem::path cacheFolder;
+    FeatureSwitches switches;
     /// Ends the process at once with this status (a fatal watchdog does).
     std::function<void(int status)> exitProcess;
 };

@@ -1,0 +1,32 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <filesystem>
+#include <memory>
+
+#include "config/Configuration.h"
+#include "core/Clock.h"
+#include "platform/PlatformServices.h"
+
+namespace keepsakes {
+
+/// The adapters to this machine, made from the configuration and owned here. Made before the
+/// services and outlives them.
+class DevicePorts {
+ public:
+    DevicePorts(const Configuration& configuration, const StandardFolders& folders,
+                std::unique_ptr<Clock> clock);
+    ~DevicePorts();
+    DevicePorts(const DevicePorts&) = delete;
+    DevicePorts& operator=(const DevicePorts&) = delete;
+
+    /// For the composition root to complete with the listener.
+    PlatformServices& services() { return services_; }
+
+ private:
+    struct Adapters;
+    const std::unique_ptr<Adapters> adapters_;
+    PlatformServices services_;
+};
+
+}  // namespace keepsakes

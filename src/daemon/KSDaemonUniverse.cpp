@@ -1,0 +1,70 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "daemon/KSDaemonUniverse.h"
+
+#include <fmt/format.h>
+
+#include <ranges>
+#include <utility>
+
+#include "bundle/KSEventBundleManager.h"
+#include "bundle/KSEventBundleStore.h"
+#include "collect/KSEventManager.h"
+#include "core/KSAssertion.h"
+#include "notify/KSDaemonSPINotifier.h"
+#include "notify/KSTocsinNotifier.h"
+#include "platform/PlatformServices.h"
+#include "service/KSManageServer.h"
+#include "sources/KSPhotoManager.h"
+#include "sources/KSVitalsManager.h"
+#include "store/KSDefaultsManager.h"
+#include "store/KSEventStore.h"
+#include "store/KSPersistenceManager.h"
+
+namespace keepsakes {
+
+namespace {
+
+constexpr double kDisabledLifeSeconds = 10;
+
+}  // namespace
+
+KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
+    : platform_(platform), exitQueue_("KSFeatureDisabledExit") {
+    // Each may look up, while it is made, only what stands above it.
+    add("TocsinNotifier",
+        std::make_shared<KSTocsinNotifier>("TocsinNotifier", *platform.lockState));
+    add("PersistenceManager", KSPersistenceManager::initWithUniverse(*this));
+    add("EventBundleStore", KSEventBundleStore::initWithUniverse(*this));
+    add("EventStore", KSEventStore::initWithUniverse(*this));
+    add("PhotoManager", KSPhotoManager::initWithUniverse(*this));
+    add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
+    add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));
+    add("EventManager", KSEventManager::initWithUniverse(*this));
+    add("EventBundleManager", KSEventBundleManager::initWithUniverse(*this));
+    const auto server = KSManageServer::initWithUniverse(*this);
+    add("Server", server);
+    add("DaemonClientNotifier", server->getNotifier());
+}
+
+KSDaemonUniverse::~KSDaemonUniverse() {
+    for (const auto& name : std::views::reverse(order_)) universe_.erase(name);
+}
+
+void KSDaemonUniverse::add(std::string_view name, std::shared_ptr<KSService> service) {
+    universe_.emplace(name, std::move(service));
+    order_.emplace_back(name);
+}
+
+std::shared_ptr<KSService> KSDaemonUniverse::getService(std::string_view name) const {
+    const auto found = universe_.find(name);
+    if (found != universe_.end()) return found->second;
+    assertionFailed(fmt::format("No service named [{}]", name), "KSDaemonUniverse", 133);
+    return nullptr;
+}
+
+void KSDaemonUniverse::run(bool anyEnabled, std::function<void()> exitInOrder) {
+    if (anyEnabled) return;
+    exitTimer_ = platform_.clock->after(exitQueue_, kDisabledLifeSeconds, std::move(exitInOrder));
+}
+
+}  // namespace keepsakes
