@@ -65,12 +65,17 @@ function(keepsakes_program name)
     target_link_libraries(${name} PRIVATE keepsakes_options ${ARG_DEPS} ${ARG_PRIVATE})
 endfunction()
 
-# keepsakes_test(<folder> SOURCES ... [DEPS <folder>...] [PRIVATE ...])
+# keepsakes_test(<folder> SOURCES ... [DEPS <folder>...] [PRIVATE ...] [PRIVATE_BUS])
 #
 # One test program a folder, its tests known to ctest one by one. ctest fails when it finds none.
+# With PRIVATE_BUS each test runs on a session bus of its own.
 function(keepsakes_test folder)
+    cmake_parse_arguments(TEST "PRIVATE_BUS" "" "" ${ARGN})
     set(name keepsakes_${folder}_tests)
-    keepsakes_program(${name} ${ARGN})
+    keepsakes_program(${name} ${TEST_UNPARSED_ARGUMENTS})
+    if(TEST_PRIVATE_BUS)
+        set_target_properties(${name} PROPERTIES CROSSCOMPILING_EMULATOR "dbus-run-session;--")
+    endif()
     target_link_libraries(${name} PRIVATE keepsakes_support GTest::gmock GTest::gtest_main)
     gtest_discover_tests(${name} TEST_PREFIX "${folder}." DISCOVERY_TIMEOUT 60
                          PROPERTIES TIMEOUT 60)

@@ -28,4 +28,18 @@ bool isPlainUtf8(std::string_view text) {
     return true;
 }
 
+std::string plainUtf8(std::string_view text) {
+    if (isPlainUtf8(text)) return std::string(text);
+    const auto* bytes = reinterpret_cast<const std::uint8_t*>(text.data());
+    const auto size = static_cast<std::int64_t>(text.size());
+    std::string plain;
+    for (std::int64_t at = 0; at < size;) {
+        const auto start = static_cast<std::size_t>(at);
+        UChar32 point = 0;
+        U8_NEXT(bytes, at, size, point);
+        plain += point > 0 ? text.substr(start, static_cast<std::size_t>(at) - start) : "\uFFFD";
+    }
+    return plain;
+}
+
 }  // namespace keepsakes

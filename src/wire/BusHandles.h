@@ -1,0 +1,23 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <systemd/sd-bus.h>
+
+#include <memory>
+
+namespace keepsakes::bus {
+
+/// Owners of the bus library's objects. Private to sources: it pulls in the library's header.
+/// The library counts references without locks, so a connection and all its messages belong to
+/// one thread.
+struct Unref {
+    void operator()(sd_bus* bus) const { sd_bus_close_unref(bus); }
+    void operator()(sd_bus_message* message) const { sd_bus_message_unref(message); }
+    void operator()(sd_bus_slot* slot) const { sd_bus_slot_unref(slot); }
+};
+
+using Connection = std::unique_ptr<sd_bus, Unref>;
+using Message = std::unique_ptr<sd_bus_message, Unref>;
+using Slot = std::unique_ptr<sd_bus_slot, Unref>;
+
+}  // namespace keepsakes::bus
