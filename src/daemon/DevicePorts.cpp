@@ -21,20 +21,20 @@ constexpr std::string_view kIndexFile = "deviceData.sqlite";
 constexpr std::string_view kIndexerProgram = "keepsakes-indexer";
 
 class ConfiguredPolicy final : public DevicePolicy {
- public:
+  public:
     ConfiguredPolicy(bool diagnostics, bool healthData)
         : diagnostics_(diagnostics), healthData_(healthData) {}
     bool diagnosticSubmissionAllowed() const override { return diagnostics_; }
     bool healthDataSubmissionAllowed() const override { return healthData_; }
 
- private:
+  private:
     const bool diagnostics_;
     const bool healthData_;
 };
 
 /// A device that does not lock its files away.
 class NoContentProtection final : public LockState {
- public:
+  public:
     bool formattedForContentProtection() const override { return false; }
     bool unlockedSinceBoot() const override { return true; }
     int currentState() const override { return 0; }

@@ -13,7 +13,7 @@ namespace keepsakes {
 /// The adapters to this machine, made from the configuration and owned here. Made before the
 /// services and outlives them.
 class DevicePorts {
- public:
+  public:
     DevicePorts(const Configuration& configuration, const StandardFolders& folders,
                 std::unique_ptr<Clock> clock);
     ~DevicePorts();
@@ -23,7 +23,7 @@ class DevicePorts {
     /// For the composition root to complete with the listener.
     PlatformServices& services() { return services_; }
 
- private:
+  private:
     struct Adapters;
     const std::unique_ptr<Adapters> adapters_;
     PlatformServices services_;

@@ -19,7 +19,7 @@ struct PlatformServices;
 /// name until the end. Made by `main`; filled in its constructor and only read afterwards, from
 /// any queue. Its destruction ends the services in the reverse order.
 class KSDaemonUniverse final : public ServiceLookup {
- public:
+  public:
     /// The switches are the platform's.
     explicit KSDaemonUniverse(const PlatformServices& platform);
     ~KSDaemonUniverse() override;
@@ -36,7 +36,7 @@ class KSDaemonUniverse final : public ServiceLookup {
     /// `exitInOrder`. Returns at once; the caller parks the main thread.
     void run(bool anyEnabled, std::function<void()> exitInOrder);
 
- private:
+  private:
     void add(std::string_view name, std::shared_ptr<KSService> service);
 
     const PlatformServices& platform_;

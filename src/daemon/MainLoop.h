@@ -8,7 +8,7 @@ namespace keepsakes {
 /// Where the main thread waits while the queues work: until SIGTERM or SIGINT comes, or `stop` is
 /// called. Made before any other thread, whose signals it keeps for itself.
 class MainLoop {
- public:
+  public:
     /// Throws std::system_error.
     MainLoop();
     ~MainLoop();
@@ -21,7 +21,7 @@ class MainLoop {
     /// Ends `run`. Any thread; the first status stands.
     void stop(int status);
 
- private:
+  private:
     int signals_ = -1;
     int wake_ = -1;
     std::atomic<int> status_ = -1;

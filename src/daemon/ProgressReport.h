@@ -11,7 +11,7 @@ namespace keepsakes {
 /// Decides which steps of long work clients hear of: none in the first second, then at most four a
 /// second. Used by one thread at a time.
 class ProgressReport {
- public:
+  public:
     explicit ProgressReport(const Clock& clock) : clock_(clock) {}
 
     bool isDue(std::string_view activity, std::uint64_t done) {
@@ -26,7 +26,7 @@ class ProgressReport {
         return true;
     }
 
- private:
+  private:
     static constexpr double kSilentSeconds = 1;
     static constexpr double kSecondsBetween = 0.25;
 

@@ -63,13 +63,13 @@ void connectSignals(const KSDaemonUniverse& universe, BusListener& listener, Clo
             if (changes.bundles) listener.emitBundlesChanged();
         });
     universe.service<KSEventManager>("EventManager")
-        ->setProgressObserver([&listener, report = std::make_shared<ProgressReport>(clock)](
-                                  std::string_view activity, std::uint64_t done,
-                                  std::uint64_t total) {
-            if (report->isDue(activity, done)) {
-                listener.emitProgress(std::string(activity), done, total);
-            }
-        });
+        ->setProgressObserver(
+            [&listener, report = std::make_shared<ProgressReport>(clock)](
+                std::string_view activity, std::uint64_t done, std::uint64_t total) {
+                if (report->isDue(activity, done)) {
+                    listener.emitProgress(std::string(activity), done, total);
+                }
+            });
 }
 
 /// Ends the process should ending in order not come to an end: what was answered is on disk.

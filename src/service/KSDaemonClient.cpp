@@ -34,7 +34,7 @@ void logTrends(const KSEventArray& events) {
 
 /// One request under way: its watchdog, and what its notification tells.
 class KSDaemonClient::Request {
- public:
+  public:
     Request(std::string_view name, const PlatformServices& platform,
             std::optional<std::string> processName)
         : watchDog(name, platform) {
@@ -64,7 +64,7 @@ class KSDaemonClient::Request {
 
     KSWatchDog watchDog;
 
- private:
+  private:
     mutable std::mutex mutex_;
     KSDictionary payload_;
     OptionalError error_;
@@ -114,39 +114,39 @@ void KSDaemonClient::storeEvents(KSEventArray events, KSConduitContext context, 
 
 void KSDaemonClient::fetchEventsWithOptions(KSEventFetchOptions options, KSConduitContext context,
                                             EventsReply reply) {
-    queue_.async([this, options, request = begin("FetchEvents", context),
-                  reply = std::move(reply)] {
-        eventManager_->fetchEventsWithOptions(
-            options, [notifier = notifier_, request, reply](KSEventArray events,
-                                                            const OptionalError& error) {
-                request->watchDog.pet();
-                request->fail(error);
-                if (!error) request->add({{std::string(kResultNumberOfEvents), events.size()}});
-                notifier->sendNotification(kFetchedEvents, request->payload());
-                request->watchDog.pet();
-                logTrends(events);
-                if (reply) reply(std::move(events), error);
-                request->watchDog.cancel();
-            });
-    });
+    queue_.async(
+        [this, options, request = begin("FetchEvents", context), reply = std::move(reply)] {
+            eventManager_->fetchEventsWithOptions(
+                options, [notifier = notifier_, request, reply](KSEventArray events,
+                                                                const OptionalError& error) {
+                    request->watchDog.pet();
+                    request->fail(error);
+                    if (!error) request->add({{std::string(kResultNumberOfEvents), events.size()}});
+                    notifier->sendNotification(kFetchedEvents, request->payload());
+                    request->watchDog.pet();
+                    logTrends(events);
+                    if (reply) reply(std::move(events), error);
+                    request->watchDog.cancel();
+                });
+        });
 }
 
 void KSDaemonClient::fetchEventBundlesWithOptions(KSEventBundleFetchOptions options,
                                                   KSConduitContext context, BundlesReply reply) {
-    queue_.async([this, options, request = begin("FetchEventBundles", context),
-                  reply = std::move(reply)] {
-        eventBundleManager_->fetchEventBundlesWithOptions(
-            options, [notifier = notifier_, request, reply](KSEventBundleArray bundles,
-                                                            const OptionalError& error,
-                                                            const KSDictionary& result) {
-                request->watchDog.pet();
-                request->add(result);
-                request->fail(error);
-                notifier->sendNotification(kFetchedEventBundles, request->payload());
-                if (reply) reply(std::move(bundles), error);
-                request->watchDog.cancel();
-            });
-    });
+    queue_.async(
+        [this, options, request = begin("FetchEventBundles", context), reply = std::move(reply)] {
+            eventBundleManager_->fetchEventBundlesWithOptions(
+                options, [notifier = notifier_, request, reply](KSEventBundleArray bundles,
+                                                                const OptionalError& error,
+                                                                const KSDictionary& result) {
+                    request->watchDog.pet();
+                    request->add(result);
+                    request->fail(error);
+                    notifier->sendNotification(kFetchedEventBundles, request->payload());
+                    if (reply) reply(std::move(bundles), error);
+                    request->watchDog.cancel();
+                });
+        });
 }
 
 void KSDaemonClient::clearEvents(KSConduitContext context, Reply reply) {

@@ -19,7 +19,7 @@ struct PlatformServices;
 /// any thread may call it and never waits: calls go out from its queue. Replies come on the
 /// managers' queues. A missing reply block is fine.
 class KSDaemonClient final : public KSKeepsakesConduitProtocol {
- public:
+  public:
     /// Identifiers on the client notifier.
     enum Notification : std::int32_t {
         kFetchedEvents = 0,
@@ -51,11 +51,12 @@ class KSDaemonClient final : public KSKeepsakesConduitProtocol {
                                EventsReply reply) override;
     void fetchPhotoAnalyticsMetrics(KSConduitContext context, DictionaryReply reply) override;
 
- private:
+  private:
     class Request;
 
     std::shared_ptr<Request> begin(std::string_view watchdogName, const KSConduitContext& context);
-    ResultHandler announcing(std::shared_ptr<Request> request, Notification identifier, Reply reply);
+    ResultHandler announcing(std::shared_ptr<Request> request, Notification identifier,
+                             Reply reply);
 
     const PlatformServices& platform_;
     const std::shared_ptr<KSDaemonSPINotifier> notifier_;

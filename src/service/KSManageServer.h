@@ -15,7 +15,7 @@ struct PlatformServices;
 /// Puts the daemon's one client object behind the listener; no caller is refused. Owned by the
 /// registry as "Server". When it goes, the listener takes no more calls.
 class KSManageServer final : public KSService {
- public:
+  public:
     /// Needs "EventManager" and "EventBundleManager".
     static std::shared_ptr<KSManageServer> initWithUniverse(const ServiceLookup& universe);
     ~KSManageServer() override;
@@ -25,7 +25,7 @@ class KSManageServer final : public KSService {
 
     KSDaemonClient& client() { return *client_; }
 
- private:
+  private:
     KSManageServer(const PlatformServices& platform, std::unique_ptr<KSDaemonClient> client,
                    std::unique_ptr<StatusReporter> status);
 

@@ -13,13 +13,13 @@ struct PlatformServices;
 /// Gathers the daemon's status: counts from the database, the last scan, the problems. Owned by
 /// the server; any thread may ask and never waits.
 class StatusReporter final : public StatusSource {
- public:
+  public:
     StatusReporter(const PlatformServices& platform,
                    std::shared_ptr<KSPersistenceManager> persistenceManager);
 
     void status(std::function<void(DaemonStatus)> reply) override;
 
- private:
+  private:
     DaemonStatus withoutCounts() const;
 
     const PlatformServices& platform_;
