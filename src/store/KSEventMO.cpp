@@ -28,7 +28,10 @@ void bind(Statement& to, int index, const KSUUID& value) {
     to.bind(index, value.bytes.data(), static_cast<int>(value.bytes.size()));
 }
 void bindBytes(Statement& to, int index, const std::optional<KSValue::Bytes>& bytes) {
-    if (bytes) to.bind(index, bytes->data(), static_cast<int>(bytes->size()));
+    if (!bytes) return;
+    // An empty vector may have no data, and that would be stored as nothing.
+    to.bind(index, bytes->empty() ? static_cast<const void*>("") : bytes->data(),
+            static_cast<int>(bytes->size()));
 }
 void bind(Statement& to, int index, const std::vector<std::string>& value) {
     bindBytes(to, index,

@@ -1,0 +1,65 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "bundle/PromptLanguage.h"
+
+#include <gtest/gtest.h>
+
+#include "bundle/BundleRules.h"
+#include "core/Calendar.h"
+#include "model/KSEventBundle.h"
+#include "support/TestEvents.h"
+
+namespace keepsakes {
+namespace {
+
+std::shared_ptr<KSEvent> photosOf(std::int64_t count, std::vector<std::string> words,
+                                  std::vector<std::string> people, KSDate start, KSDate end) {
+    auto event = makePhotos(2, start.seconds, end.seconds, {});
+    auto attributes = KSEventExtendedAttributes::initWithLocalIdentifier("k");
+    attributes->photoKeepsakeInferences = std::move(words);
+    attributes->photoCount = count;
+    for (const auto& name : people) {
+        if (!attributes->photoKeepsakePersons) attributes->photoKeepsakePersons.emplace();
+        attributes->photoKeepsakePersons->push_back({{}, name, {}, {}});
+    }
+    event->extendedAttributes = std::move(attributes);
+    return event;
+}
+
+std::string prompt(std::string rule, KSEventArray events) {
+    const auto bundle = KSEventBundle::initWithEventSet(std::move(events), true, {});
+    bundle->bundleType = std::move(rule);
+    return promptLanguageOf(*bundle);
+}
+
+TEST(PromptLanguage, SaysWhatABundleHolds) {
+    const KSDate saturday = *calendar::dateOfDay(2024, 6, 15);
+    const KSDate start = saturday + 10 * 3600 + 120;
+    const KSDate end = saturday + 12 * 3600 + 1860;
+    const auto hike = makeWorkout(1, start.seconds, end.seconds, "Hiking");
+    const auto mountains = photosOf(14, {"nature", "mountain"}, {}, start - 60, end + 60);
+    EXPECT_EQ(prompt("HikingPlusPhotos", {hike, mountains}),
+              "A hike with photos: Hiking, Saturday 10:02 to 12:31, 14 photos of mountains");
+    EXPECT_EQ(prompt("", {hike, photosOf(1, {}, {"Anna"}, start, end)}),
+              "A workout with photos: Hiking, Saturday 10:02 to 12:31, 1 photo, with Anna");
+    EXPECT_EQ(
+        prompt("BirthdayPhotos", {photosOf(3, {"birthday"}, {"Anna", "Ben", "Cleo", "Dan", "Eva"},
+                                           saturday + 22 * 3600, saturday + 25 * 3600)}),
+        "A birthday: Saturday 22:00 to Sunday 01:00, 3 photos of a birthday, with Anna, Ben, "
+        "Cleo and 2 others");
+    EXPECT_EQ(prompt("", {makeVisit(1, start.seconds, start.seconds, "Museum")}),
+              "A visit: Museum, Saturday 10:02");
+    EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
+                                    KSEventCategory::topic)}),
+              "A moment: Saturday 10:02 to 12:31");
+}
+
+TEST(PromptLanguage, HasASentenceForEveryRule) {
+    for (const auto& rule : predicatesOfDesiredExperiences()) {
+        EXPECT_NE(prompt(std::string(rule.name), {makeWorkout(1, 1, 2, "x")}),
+                  prompt("", {makeWorkout(1, 1, 2, "x")}))
+            << rule.name;
+    }
+}
+
+}  // namespace
+}  // namespace keepsakes

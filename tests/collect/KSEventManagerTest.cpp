@@ -1,0 +1,188 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "collect/KSEventManager.h"
+
+#include <gmock/gmock.h>
+
+#include "StoreFixture.h"
+#include "sources/KSPhotoManager.h"
+#include "sources/KSVitalsManager.h"
+#include "store/KSDefaultsManager.h"
+#include "support/RecordedAssertions.h"
+
+namespace keepsakes {
+namespace {
+
+using testing::ElementsAre;
+
+class Manager : public StoreFixture {
+  protected:
+    Manager() {
+        universe->add("EventStore", store);
+        universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
+        universe->add("PhotoManager", KSPhotoManager::initWithUniverse(*universe));
+        universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
+        events = KSEventManager::initWithUniverse(*universe);
+    }
+
+    /// The error's text and the result, once the queues are at rest.
+    struct Outcome {
+        std::string error = "(no answer)";
+        std::string result;
+    };
+    ResultHandler into(const std::shared_ptr<Outcome>& outcome) {
+        return [outcome](const OptionalError& error, const KSDictionary& result) {
+            outcome->error = error ? error->description() : "";
+            outcome->result = KSValue(result).description();
+        };
+    }
+    template <class Operation>
+    Outcome run(Operation operation) {
+        const auto outcome = std::make_shared<Outcome>();
+        (events.get()->*operation)(into(outcome));
+        WorkerThreads::shared().settle();
+        return *outcome;
+    }
+
+    KSDate now() const { return platform.clock.now(); }
+
+    std::shared_ptr<KSEventManager> events;
+};
+
+TEST_F(Manager, CollectsEverySourceAndSumsWhatTheySaved) {
+    platform.health.samples = {{now() - 5000, now() - 4000, 24}, {now() - 300, now() - 100, 37}};
+    platform.photos.keepsakes = {{"a", {now() - 4900, now() - 4800}, {}}};
+    const auto outcome = run(&KSEventManager::collectEventsWithHandler);
+    EXPECT_EQ(outcome.error, "");
+    EXPECT_EQ(outcome.result, R"({"resultNumberOfEvents": 3, "stateDatabaseAvailable": true})");
+    EXPECT_EQ(platform.deviceData.scans, 1) << "the index is brought up to date first";
+    EXPECT_EQ(manager->getCollectionDate(), now());
+}
+
+TEST_F(Manager, TakesTheWindowFromTheDefaultsUnlessItLiesAhead) {
+    const std::string key = "com.brindle.keepsakesd/EventManagerEventCollectionStartDate";
+    const auto windowStart = [this] {
+        run(&KSEventManager::collectEventsWithHandler);
+        EXPECT_EQ(platform.health.asked.back().end, now());
+        return platform.health.asked.back().start - now();
+    };
+    EXPECT_EQ(windowStart(), -259200);
+    platform.defaults.values[key] = now() - 10;
+    EXPECT_EQ(windowStart(), -10);
+    platform.defaults.values[key] = now();
+    EXPECT_EQ(windowStart(), 0);
+    platform.defaults.values[key] = now() + 1;
+    EXPECT_EQ(windowStart(), -259200);
+    platform.defaults.values[key] = "not a date";
+    EXPECT_EQ(windowStart(), -259200);
+}
+
+TEST_F(Manager, AFailingSourceIsMarkedAndTheNextOneStillRuns) {
+    platform.health.nextError = KSError::make("Health", 1, "not authorised");
+    platform.photos.keepsakes = {{"a", {now() - 4900, now() - 4800}, {}}};
+    const auto outcome = run(&KSEventManager::collectEventsWithHandler);
+    EXPECT_EQ(outcome.error, "");
+    EXPECT_EQ(outcome.result, R"({"resultNumberOfEvents": 1, "resultWorkoutsSuccess": false, )"
+                              R"("stateDatabaseAvailable": true})");
+}
+
+TEST_F(Manager, ASilentSourceCostsTwoMinutesAndOnlyItself) {
+    platform.health.silent = true;
+    platform.photos.keepsakes = {{"a", {now() - 4900, now() - 4800}, {}}};
+    const auto outcome = std::make_shared<Outcome>();
+    events->collectEventsWithHandler(into(outcome));
+    platform.clock.advance(119.9);
+    EXPECT_EQ(outcome->error, "(no answer)");
+    platform.clock.advance(0.2);
+    EXPECT_EQ(outcome->error, "");
+    EXPECT_EQ(outcome->result, R"({"resultNumberOfEvents": 1, "resultWorkoutsSuccess": false, )"
+                               R"("stateDatabaseAvailable": true})");
+}
+
+TEST_F(Manager, FetchesInTheOrderAskedForWithDetailsFilledInAgain) {
+    storeAll({makePhotos(1, 10, 20, {}), makeWorkout(2, 5, 8, "a"), makeWorkout(3, 30, 40, "b"),
+              makePhotos(4, 35, 36, {})});
+    platform.photos.keepsakes = {{"keepsake1", {{10}, {20}}, {"Beach"}}};
+    const auto fetched = [this](bool ascending) {
+        KSEventArray answer;
+        events->fetchEventsWithOptions(
+            {.ascending = ascending},
+            [&answer](KSEventArray found, const OptionalError&) { answer = std::move(found); });
+        WorkerThreads::shared().settle();
+        return answer;
+    };
+    EXPECT_EQ(numbersOf(fetched(true)), (std::vector{2, 1, 3})) << "4 is gone at its source";
+    EXPECT_EQ(numbersOf(fetched(false)), (std::vector{3, 1, 2}));
+    EXPECT_THAT(*fetched(true)[1]->extendedAttributes->photoKeepsakeInferences,
+                ElementsAre("beach"));
+}
+
+TEST_F(Manager, CleansWhatExpiredIsUnknownOrWasDeletedAtItsSource) {
+    const auto expired = makeWorkout(1, 10, 20, "a");
+    expired->expirationDate = now() - 1;
+    const auto topic = makeEvent(5, 1, 2, KSEventProvider::foresight, KSEventCategory::topic);
+    storeAll({expired, makeWorkout(2, 10, 20, "b"), makePhotos(3, 10, 20, {}),
+              makePhotos(4, 10, 20, {}), topic, makeVisit(6, 1, 2, "unknown")});
+    execute("UPDATE KSEventMO SET category = 0 WHERE placeName = 'unknown'");
+    platform.photos.keepsakes = {{"keepsake3", {{10}, {20}}, {}}};
+    const auto outcome = run(&KSEventManager::cleanUpEventsWithHandler);
+    EXPECT_EQ(outcome.error, "");
+    EXPECT_EQ(outcome.result, R"({"resultNumberOfEvents": 3, "stateDatabaseAvailable": true})");
+    EXPECT_EQ(platform.deviceData.scans, 1) << "what was deleted is known before it is asked for";
+    auto left = numbersOf(fetch({}));
+    std::ranges::sort(left);
+    EXPECT_EQ(left, (std::vector{2, 3, 5}));
+    EXPECT_EQ(run(&KSEventManager::clearEventsWithHandler).result,
+              R"({"resultNumberOfEvents": 3})");
+}
+
+TEST_F(Manager, WithoutADatabaseEveryOperationSaysSo) {
+    events.reset();
+    close();
+    platform.folder.write("cache/keepsakesDataModel.sqlite", "");
+    std::filesystem::remove_all(platform.services.cacheFolder);
+    platform.folder.write("cache", "a file where the folder should be");
+    open();
+    universe->add("EventStore", store);
+    universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
+    events = KSEventManager::initWithUniverse(*universe);
+    for (const auto operation :
+         {&KSEventManager::collectEventsWithHandler, &KSEventManager::cleanUpEventsWithHandler,
+          &KSEventManager::clearEventsWithHandler, &KSEventManager::runAnalyticsWithHandler}) {
+        const auto outcome = run(operation);
+        EXPECT_EQ(outcome.error, "database is not avaialble");
+        EXPECT_EQ(outcome.result, R"({"stateDatabaseAvailable": false})");
+    }
+    EXPECT_EQ(platform.deviceData.scans, 0);
+    EXPECT_FALSE(platform.problems.list().empty());
+    std::filesystem::remove(platform.services.cacheFolder);
+    EXPECT_EQ(run(&KSEventManager::clearEventsWithHandler).error, "")
+        << "the next check tries again";
+}
+
+TEST_F(Manager, AnalyticsAnswersThatThereAreNoPlans) {
+    EXPECT_EQ(run(&KSEventManager::runAnalyticsWithHandler).error,
+              "Analytics Plans are not avaialble");
+}
+
+TEST_F(Manager, NeedsItsServices) {
+    TestUniverse empty(platform.services);
+    RecordedAssertions assertions;
+    EXPECT_EQ(KSEventManager::initWithUniverse(empty), nullptr);
+    empty.add("EventStore", store);
+    EXPECT_EQ(KSEventManager::initWithUniverse(empty), nullptr);
+    EXPECT_THAT(assertions.takeDescriptions(),
+                ElementsAre("Invalid parameter not satisfying: eventStore",
+                            "Invalid parameter not satisfying: defaultsManager"));
+}
+
+TEST(EventGroups, AreNamedByCategoryAndProvider) {
+    const auto groups = KSEventManager::splitEventArrayByCategory(
+        {makeVisit(1, 1, 2, "a"), makeWorkout(2, 1, 2, "b"), makeVisit(3, 0, 1, "c")});
+    ASSERT_EQ(groups.size(), 2u);
+    EXPECT_EQ(groups.at("Visit:Routine").size(), 2u);
+    EXPECT_EQ(groups.at("Workout:Health").size(), 1u);
+    EXPECT_EQ(KSEventManager::mergeEventArraysFromDict(groups).size(), 3u);
+}
+
+}  // namespace
+}  // namespace keepsakes

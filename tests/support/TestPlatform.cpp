@@ -1,0 +1,130 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "support/TestPlatform.h"
+
+#include <algorithm>
+#include <ranges>
+
+#include "platform/ActivityCatalogue.h"
+
+namespace keepsakes {
+
+void FakeHealthStore::queryWorkouts(KSDateInterval window, std::function<void(Workouts)> handler) {
+    queue_.async([this, window, handler = std::move(handler)] {
+        asked.push_back(window);
+        if (silent) return;
+        if (nextError) {
+            handler(std::unexpected(*std::exchange(nextError, std::nullopt)));
+            return;
+        }
+        std::vector<WorkoutSample> found;
+        std::ranges::copy_if(samples, std::back_inserter(found), [window](const auto& sample) {
+            return sample.end >= window.start && sample.end <= window.end;
+        });
+        std::ranges::stable_sort(found, [](const auto& a, const auto& b) { return b.end < a.end; });
+        handler(std::move(found));
+    });
+}
+
+std::string FakeHealthStore::displayName(int activityType) const {
+    return std::string(activityName(activityType).value_or("Other"));
+}
+
+std::expected<std::optional<DateComponents>, KSError> FakeHealthStore::dateOfBirth() const {
+    if (nextError) return std::unexpected(*nextError);
+    return born;
+}
+
+std::expected<std::optional<int>, KSError> FakeHealthStore::biologicalSex() const {
+    if (nextError) return std::unexpected(*nextError);
+    return sex;
+}
+
+KSDictionary FakePhotoAnalysis::dictionaryOf(const Keepsake& keepsake) {
+    KSDictionary dictionary{
+        {std::string(kKSKeyLocalIdentifier), keepsake.identifier},
+        {std::string(kKSKeyEventUniversalDateInterval),
+         KSDictionary{{std::string(kKSKeyIntervalStart), keepsake.interval.start},
+                      {std::string(kKSKeyIntervalEnd), keepsake.interval.end}}},
+        {std::string(kKSKeyInferences),
+         KSArray(keepsake.inferences.begin(), keepsake.inferences.end())},
+        {std::string(kKSKeyPhotoCount), keepsake.photoCount},
+    };
+    KSArray persons;
+    for (const auto& name : keepsake.persons) {
+        persons.emplace_back(KSDictionary{{std::string(kKSKeyPersonName), name}});
+    }
+    if (!persons.empty()) dictionary.emplace(kKSKeyPersons, std::move(persons));
+    return dictionary;
+}
+
+template <class Wanted>
+PhotoAnalysis::Summary FakePhotoAnalysis::summaryOf(const Wanted& wanted) {
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    KSArray events;
+    for (const auto& keepsake : keepsakes) {
+        if (wanted(keepsake)) events.emplace_back(dictionaryOf(keepsake));
+    }
+    return KSDictionary{{std::string(kKSKeyGraphCreationDate), graphCreationDate},
+                        {std::string(kKSKeyEvents), std::move(events)}};
+}
+
+PhotoAnalysis::Summary FakePhotoAnalysis::summary(KSDateInterval interval) {
+    return summaryOf([interval](const Keepsake& keepsake) {
+        return keepsake.interval.start <= interval.end && keepsake.interval.end >= interval.start;
+    });
+}
+
+PhotoAnalysis::Summary FakePhotoAnalysis::summary(std::span<const std::string> identifiers) {
+    batchSizes.push_back(identifiers.size());
+    return summaryOf([identifiers](const Keepsake& keepsake) {
+        return std::ranges::find(identifiers, keepsake.identifier) != identifiers.end();
+    });
+}
+
+void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
+    const std::lock_guard lock(mutex_);
+    sent_.emplace_back(event, fields);
+}
+
+std::vector<std::pair<std::string, KSDictionary>> FakeAnalytics::take() {
+    const std::lock_guard lock(mutex_);
+    return std::exchange(sent_, {});
+}
+
+KSValue FakeDefaults::object(std::string_view domain, std::string_view key) const {
+    const auto found = values.find(std::string(domain) + "/" + std::string(key));
+    return found == values.end() ? KSValue() : found->second;
+}
+
+OptionalError FakeDefaults::setObject(std::string_view domain, std::string_view key,
+                                      const KSValue& value) {
+    values[std::string(domain) + "/" + std::string(key)] = value;
+    return std::nullopt;
+}
+
+ScanReport FakeDeviceData::refresh(const Progress& progress) {
+    ++scans;
+    progress(1, 1);
+    return report;
+}
+
+TestPlatform::TestPlatform() {
+    services.clock = &clock;
+    services.devicePolicy = &policy;
+    services.lockState = &lock;
+    services.userDefaults = &defaults;
+    services.analytics = &analytics;
+    services.healthStore = &health;
+    services.photoAnalysis = &photos;
+    services.deviceData = &deviceData;
+    services.problems = &problems;
+    services.cacheFolder = folder / "cache";
+    services.exitProcess = [this](int status) { exits.push_back(status); };
+}
+
+std::shared_ptr<KSService> TestUniverse::getService(std::string_view name) const {
+    const auto found = services_.find(name);
+    return found == services_.end() ? nullptr : found->second;
+}
+
+}  // namespace keepsakes

@@ -1,0 +1,151 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <atomic>
+#include <deque>
+#include <map>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "core/Problems.h"
+#include "core/ServiceLookup.h"
+#include "core/WorkQueue.h"
+#include "platform/AnalyticsService.h"
+#include "platform/DeviceDataIndex.h"
+#include "platform/DeviceState.h"
+#include "platform/HealthStore.h"
+#include "platform/PhotoAnalysis.h"
+#include "platform/PlatformServices.h"
+#include "platform/UserDefaults.h"
+#include "support/TemporaryFolder.h"
+#include "support/VirtualClock.h"
+
+namespace keepsakes {
+
+/// A health store in memory: holds workouts, fails or stays silent when told to, tells what it was
+/// asked.
+class FakeHealthStore final : public HealthStore {
+  public:
+    std::vector<WorkoutSample> samples;
+    std::optional<DateComponents> born;
+    std::optional<int> sex;
+    std::optional<KSError> nextError;
+    bool silent = false;
+    std::vector<KSDateInterval> asked;
+
+    void queryWorkouts(KSDateInterval window, std::function<void(Workouts)> handler) override;
+    std::string displayName(int activityType) const override;
+    std::expected<std::optional<DateComponents>, KSError> dateOfBirth() const override;
+    std::expected<std::optional<int>, KSError> biologicalSex() const override;
+
+  private:
+    WorkQueue queue_{"FakeHealthStore"};
+};
+
+/// A photo analysis in memory, likewise.
+class FakePhotoAnalysis final : public PhotoAnalysis {
+  public:
+    struct Keepsake {
+        std::string identifier;
+        KSDateInterval interval;
+        std::vector<std::string> inferences;
+        std::int64_t photoCount = 1;
+        std::vector<std::string> persons;
+    };
+    std::vector<Keepsake> keepsakes;
+    KSDate graphCreationDate{1000};
+    std::optional<KSError> nextError;
+    std::vector<std::size_t> batchSizes;
+
+    Summary summary(KSDateInterval interval) override;
+    Summary summary(std::span<const std::string> identifiers) override;
+
+    static KSDictionary dictionaryOf(const Keepsake& keepsake);
+
+  private:
+    template <class Wanted>
+    Summary summaryOf(const Wanted& wanted);
+};
+
+class FakeAnalytics final : public AnalyticsService {
+  public:
+    void send(std::string_view event, const KSDictionary& fields) override;
+    std::vector<std::pair<std::string, KSDictionary>> take();
+
+  private:
+    std::mutex mutex_;
+    std::vector<std::pair<std::string, KSDictionary>> sent_;
+};
+
+class FakeDefaults final : public UserDefaults {
+  public:
+    std::map<std::string, KSValue, std::less<>> values;  ///< By "<domain>/<key>".
+    KSValue object(std::string_view domain, std::string_view key) const override;
+    OptionalError setObject(std::string_view domain, std::string_view key,
+                            const KSValue& value) override;
+};
+
+class FakeLockState final : public LockState {
+  public:
+    bool protects = false;
+    bool unlocked = false;
+    int current = 0;
+    bool formattedForContentProtection() const override { return protects; }
+    bool unlockedSinceBoot() const override { return unlocked; }
+    int currentState() const override { return current; }
+};
+
+class FakeDevicePolicy final : public DevicePolicy {
+  public:
+    bool diagnosticSubmissionAllowed() const override { return true; }
+    bool healthDataSubmissionAllowed() const override { return true; }
+};
+
+class FakeDeviceData final : public DeviceDataIndex {
+  public:
+    ScanReport report;
+    std::atomic<int> scans = 0;
+    ScanReport refresh(const Progress& progress) override;
+    ScanReport lastReport() const override { return report; }
+    void stop() override {}
+};
+
+/// Everything the daemon needs of a device, in memory, with a folder of its own and a clock that
+/// the test moves.
+struct TestPlatform {
+    TestPlatform();
+
+    TemporaryFolder folder;
+    VirtualClock clock;
+    Problems problems;
+    FakeHealthStore health;
+    FakePhotoAnalysis photos;
+    FakeAnalytics analytics;
+    FakeDefaults defaults;
+    FakeLockState lock;
+    FakeDevicePolicy policy;
+    FakeDeviceData deviceData;
+    std::vector<int> exits;
+    PlatformServices services;
+};
+
+/// A registry that a test fills itself.
+class TestUniverse final : public ServiceLookup {
+  public:
+    explicit TestUniverse(const PlatformServices& platform) : platform_(platform) {}
+
+    std::shared_ptr<KSService> getService(std::string_view name) const override;
+    const PlatformServices& platform() const override { return platform_; }
+    void add(const std::string& name, std::shared_ptr<KSService> service) {
+        services_[name] = std::move(service);
+    }
+
+  private:
+    const PlatformServices& platform_;
+    std::map<std::string, std::shared_ptr<KSService>, std::less<>> services_;
+};
+
+}  // namespace keepsakes
