@@ -13,23 +13,14 @@ parallel_jobs() {
 
 # build PRESET: configures and builds, showing how far it is; what the tools say only on failure.
 build() {
-    local preset=$1 log
+    local preset=$1 log=build/$1/build.log
     mkdir -p "build/$preset"
-    log=build/$preset/build.log
-    cmake --preset "$preset" >"$log" 2>&1 </dev/null || {
+    if ! cmake --preset "$preset" >"$log" 2>&1 </dev/null; then
         cat "$log" >&2
         return 1
-    }
-    if [ -t 1 ]; then
-        cmake --build --preset "$preset" -j "$(parallel_jobs)" 2>&1 </dev/null | tee "$log" |
-            awk -v preset="$preset" '/^\[[0-9]+\/[0-9]+\]/ { printf "\rbuilding %s %s ", preset, $1; fflush() }
-                                     END { printf "\r\033[K" }'
-    else
-        # Every tenth step, so that a log kept by a machine tells a slow build from a stuck one.
-        cmake --build --preset "$preset" -j "$(parallel_jobs)" 2>&1 </dev/null | tee "$log" |
-            awk -v preset="$preset" '/^\[[0-9]+\/[0-9]+\]/ { if (++steps % 10 == 0) { print "building", preset, $1; fflush() } }'
     fi
-    if [ "${PIPESTATUS[0]}" -ne 0 ]; then
+    if ! cmake --build --preset "$preset" -j "$(parallel_jobs)" 2>&1 </dev/null | tee "$log" |
+        show_steps "built $preset" '^\[[0-9]+\/[0-9]+\]'; then
         grep -vE '^\[[0-9]+/[0-9]+\] (Building|Linking)' "$log" >&2
         return 1
     fi
@@ -38,17 +29,25 @@ build() {
 # run_tests PRESET [CTEST ARGUMENT...]: what the tests say only of those that fail; ctest's closing
 # line in any case. No test at all is a failure.
 run_tests() {
-    local preset=$1 log status=0
+    local preset=$1 log=build/$1/test.log
     shift
-    log=build/$preset/test.log
-    ctest --preset "$preset" --no-tests=error -j "$(parallel_jobs)" "$@" </dev/null 2>&1 | tee "$log" |
-        awk '/^ *[0-9]+\/[0-9]+ Test/ { split($1, at, "/"); if (at[1] % 50 == 0) { print "tested", $1; fflush() } }' ||
-        true
-    status=${PIPESTATUS[0]}
-    if [ "$status" -ne 0 ]; then
-        grep -vE 'Passed +[0-9.]+ sec$|^ +Start +[0-9]+:' "$log" >&2
-    else
-        grep -E 'tests passed' "$log"
+    if ! ctest --preset "$preset" --no-tests=error -j "$(parallel_jobs)" "$@" 2>&1 </dev/null |
+        tee "$log" | show_steps "tested $preset" '^ *[0-9]+\/[0-9]+ Test'; then
+        grep -vE 'Passed +[0-9.]+ sec|^ +Start +[0-9]+:' "$log" >&2
+        return 1
     fi
-    return "$status"
+    grep -E 'tests passed' "$log"
+}
+
+# show_steps LABEL PATTERN: of the lines on its input, shows the counts ("[12/340]", "12/340") that
+# begin those matching the pattern: on a terminal in place, elsewhere every fiftieth, so that a log
+# tells a slow run from a stuck one.
+show_steps() {
+    local terminal=0
+    if [ -t 1 ]; then terminal=1; fi
+    awk -v label="$1" -v pattern="$2" -v terminal="$terminal" '
+        $0 !~ pattern { next }
+        terminal { printf "\r%s %s ", label, $1; fflush(); next }
+        ++steps % 50 == 0 { print label, $1; fflush() }
+        END { if (terminal) printf "\r\033[K" }'
 }
