@@ -6,7 +6,8 @@
 parallel_jobs() {
     local processors memory
     processors=$(nproc)
-    memory=$(awk '/^MemAvailable:/ { print int($2 / 1048576) }' /proc/meminfo)
+    memory=$(awk '/^MemAvailable:/ { print int($2 / 1048576) }' /proc/meminfo 2>/dev/null) ||
+        memory=$processors
     [ "$memory" -ge 1 ] || memory=1
     echo $((memory < processors ? memory : processors))
 }

@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <system_error>
 
 namespace keepsakes {
@@ -15,7 +16,7 @@ namespace {
 
 /// Owns a file descriptor.
 class Descriptor {
- public:
+  public:
     explicit Descriptor(int fd) : fd_(fd) {}
     ~Descriptor() {
         if (fd_ >= 0) ::close(fd_);
@@ -24,7 +25,7 @@ class Descriptor {
     Descriptor& operator=(const Descriptor&) = delete;
     int get() const { return fd_; }
 
- private:
+  private:
     int fd_;
 };
 
@@ -40,9 +41,9 @@ bool writeAll(int fd, std::string_view content) {
 }  // namespace
 
 KSError posixError(int code, std::string_view what, const std::filesystem::path& path) {
-    return KSError::make(kPosixErrorDomain, code,
-                         fmt::format("{} {}: {}", what, path.string(),
-                                     std::generic_category().message(code)));
+    return KSError::make(
+        kPosixErrorDomain, code,
+        fmt::format("{} {}: {}", what, path.string(), std::generic_category().message(code)));
 }
 
 std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
@@ -50,7 +51,7 @@ std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
     // Without O_NONBLOCK, opening a pipe that somebody left in the folder would wait for ever.
     const Descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
     if (file.get() < 0) return std::unexpected(posixError(errno, "open", path));
-    struct stat info{};
+    struct stat info {};
     if (::fstat(file.get(), &info) != 0) return std::unexpected(posixError(errno, "stat", path));
     if (!S_ISREG(info.st_mode)) return std::unexpected(posixError(EINVAL, "not a file:", path));
     if (static_cast<std::uintmax_t>(info.st_size) > largest) {
@@ -70,11 +71,10 @@ std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
 }
 
 OptionalError replaceFile(const std::filesystem::path& path, std::string_view content) {
-    auto beside = path;
-    beside += ".new";
+    // A name of its own: two writers at once must not mix their contents.
+    std::string beside = path.string() + ".XXXXXX";
     {
-        const Descriptor file(
-            ::open(beside.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600));
+        const Descriptor file(::mkostemp(beside.data(), O_CLOEXEC));
         if (file.get() < 0) return posixError(errno, "create", beside);
         if (!writeAll(file.get(), content) || ::fsync(file.get()) != 0) {
             const int code = errno;
@@ -82,7 +82,11 @@ OptionalError replaceFile(const std::filesystem::path& path, std::string_view co
             return posixError(code, "write", beside);
         }
     }
-    if (::rename(beside.c_str(), path.c_str()) != 0) return posixError(errno, "replace", path);
+    if (::rename(beside.c_str(), path.c_str()) != 0) {
+        const int code = errno;
+        ::unlink(beside.c_str());
+        return posixError(code, "replace", path);
+    }
     return std::nullopt;
 }
 

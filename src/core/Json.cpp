@@ -40,15 +40,19 @@ struct ToJson {
 
 KSValue fromJson(const json& value) {
     switch (value.type()) {
-        case json::value_t::boolean: return value.get<bool>();
-        case json::value_t::number_integer: return value.get<std::int64_t>();
+        case json::value_t::boolean:
+            return value.get<bool>();
+        case json::value_t::number_integer:
+            return value.get<std::int64_t>();
         case json::value_t::number_unsigned: {
             const auto number = value.get<std::uint64_t>();
             if (number > INT64_MAX) return static_cast<double>(number);
             return static_cast<std::int64_t>(number);
         }
-        case json::value_t::number_float: return value.get<double>();
-        case json::value_t::string: return value.get<std::string>();
+        case json::value_t::number_float:
+            return value.get<double>();
+        case json::value_t::string:
+            return value.get<std::string>();
         case json::value_t::array: {
             KSArray array;
             array.reserve(value.size());
@@ -60,7 +64,8 @@ KSValue fromJson(const json& value) {
             for (const auto& [key, item] : value.items()) dictionary.emplace(key, fromJson(item));
             return dictionary;
         }
-        default: return {};
+        default:
+            return {};
     }
 }
 
@@ -78,8 +83,10 @@ std::optional<std::string> jsonText(const KSValue& value) {
 
 std::optional<KSValue> parseJson(std::string_view text) {
     bool tooDeep = false;
-    const auto limitDepth = [&tooDeep](int depth, json::parse_event_t, json&) {
-        tooDeep |= depth > kDeepest;
+    const auto limitDepth = [&tooDeep](int depth, json::parse_event_t event, json&) {
+        const bool opens =
+            event == json::parse_event_t::array_start || event == json::parse_event_t::object_start;
+        tooDeep |= opens && depth >= kDeepest;
         return !tooDeep;
     };
     try {

@@ -13,7 +13,7 @@ namespace {
 
 /// A cursor over the text; every reader leaves it where it was when it answers no.
 class Cursor {
- public:
+  public:
     explicit Cursor(std::string_view text) : rest_(text) {}
 
     bool atEnd() const { return rest_.empty(); }
@@ -49,7 +49,7 @@ class Cursor {
         return any ? std::optional(value) : std::nullopt;
     }
 
- private:
+  private:
     std::string_view rest_;
     char last_ = 0;
 };
@@ -79,7 +79,8 @@ std::optional<TimeOfDay> readTime(Cursor& in) {
             time.fraction = *fraction;
         }
     }
-    if (time.hour == 24 && (time.minute != 0 || time.second != 0)) return std::nullopt;
+    const bool pastTheHour = time.minute != 0 || time.second != 0 || time.fraction != 0;
+    if (time.hour == 24 && pastTheHour) return std::nullopt;
     return time;
 }
 
@@ -130,18 +131,17 @@ std::optional<ParsedDate> parseISO8601(std::string_view text) {
 
     const auto days = chr::sys_days(ymd).time_since_epoch().count();
     const double unixSeconds = static_cast<double>(days) * 86400.0 + time.hour * 3600 +
-                               time.minute * 60 + time.second + time.fraction -
-                               offset.value_or(0);
+                               time.minute * 60 + time.second + time.fraction - offset.value_or(0);
     return ParsedDate{KSDate::fromUnix(unixSeconds), offset};
 }
 
 std::string formatISO8601(KSDate date) {
     namespace chr = std::chrono;
-    constexpr double kYear1 = -62135596800.0;
-    constexpr double kYear10000 = 253402300800.0;
-    const double unixSeconds = date.unixSeconds();
-    if (!(unixSeconds >= kYear1 && unixSeconds < kYear10000 - 1)) return "invalid";
-    const auto total = static_cast<std::int64_t>(std::llround(unixSeconds * 1000));
+    constexpr double kYear1 = -62135596800000.0;  // in milliseconds
+    constexpr double kYear10000 = 253402300800000.0;
+    const double rounded = std::round(date.unixSeconds() * 1000);
+    if (!(rounded >= kYear1 && rounded < kYear10000)) return "invalid";
+    const auto total = static_cast<std::int64_t>(rounded);
     const chr::sys_time<chr::milliseconds> instant{chr::milliseconds(total)};
     const auto midnight = chr::floor<chr::days>(instant);
     const chr::year_month_day ymd(midnight);
