@@ -13,7 +13,7 @@ namespace keepsakes {
 /// Keeps delayed work pending while it lives; destroying or cancelling it drops what has not begun.
 /// On the queue that the work belongs to, cancelling is final: it never runs afterwards.
 class Timer {
- public:
+  public:
     Timer() = default;
     explicit Timer(std::function<void()> cancel);
     Timer(Timer&&) noexcept;
@@ -21,14 +21,14 @@ class Timer {
     ~Timer();
     void cancel();
 
- private:
+  private:
     std::function<void()> cancel_;
 };
 
 /// The one source of time: "now", delayed work and timed waits. Outlives every service.
 /// Any thread may call it. Tests put a virtual clock in its place.
 class Clock {
- public:
+  public:
     virtual ~Clock() = default;
 
     virtual KSDate now() const = 0;
@@ -39,7 +39,7 @@ class Clock {
     /// Waits for a signal, at most `seconds`; whether it came.
     bool wait(Semaphore& semaphore, double seconds);
 
- protected:
+  protected:
     /// Calls `fire` once, on the clock's own thread, `delaySeconds` from now; `fire` is brief. The
     /// answer drops it when called before that.
     virtual std::function<void()> schedule(double delaySeconds, std::function<void()> fire) = 0;
@@ -48,17 +48,17 @@ class Clock {
 /// The system's clock, optionally shifted so that it starts at a given instant and runs on from
 /// there. Delays are counted on the monotonic clock; its thread wakes only when one is due.
 class SystemClock final : public Clock {
- public:
+  public:
     SystemClock();
     explicit SystemClock(KSDate startingAt);
     ~SystemClock() override;
 
     KSDate now() const override;
 
- protected:
+  protected:
     std::function<void()> schedule(double delaySeconds, std::function<void()> fire) override;
 
- private:
+  private:
     struct State;
     double shift_ = 0;
     std::shared_ptr<State> state_;

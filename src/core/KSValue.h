@@ -20,7 +20,7 @@ namespace keepsakes {
 /// keyed archives are made of it. A plain value, copied deep. The readers are strict about kinds
 /// and answer nothing for another kind; only `asNumber` takes integers and doubles alike.
 class KSValue {
- public:
+  public:
     using Bytes = std::vector<std::uint8_t>;
     using Array = std::vector<KSValue>;
     using Dictionary = std::map<std::string, KSValue, std::less<>>;
@@ -28,17 +28,17 @@ class KSValue {
     KSValue() = default;
     KSValue(bool value) : data_(value) {}  // NOLINT(google-explicit-constructor): literals
     template <std::integral T>
-        requires(!std::same_as<T, bool>)
-    KSValue(T value) : data_(static_cast<std::int64_t>(value)) {}  // NOLINT: as above
-    KSValue(double value) : data_(value) {}                        // NOLINT: as above
-    KSValue(const char* value) : data_(std::string(value)) {}      // NOLINT: as above
+    requires(!std::same_as<T, bool>) KSValue(T value)
+        : data_(static_cast<std::int64_t>(value)) {}                // NOLINT: as above
+    KSValue(double value) : data_(value) {}                         // NOLINT: as above
+    KSValue(const char* value) : data_(std::string(value)) {}       // NOLINT: as above
     KSValue(std::string_view value) : data_(std::string(value)) {}  // NOLINT: as above
-    KSValue(std::string value) : data_(std::move(value)) {}        // NOLINT: as above
-    KSValue(Bytes value) : data_(std::move(value)) {}              // NOLINT: as above
-    KSValue(KSDate value) : data_(value) {}                        // NOLINT: as above
-    KSValue(KSUUID value) : data_(value) {}                        // NOLINT: as above
-    KSValue(Array value) : data_(std::move(value)) {}              // NOLINT: as above
-    KSValue(Dictionary value) : data_(std::move(value)) {}         // NOLINT: as above
+    KSValue(std::string value) : data_(std::move(value)) {}         // NOLINT: as above
+    KSValue(Bytes value) : data_(std::move(value)) {}               // NOLINT: as above
+    KSValue(KSDate value) : data_(value) {}                         // NOLINT: as above
+    KSValue(KSUUID value) : data_(value) {}                         // NOLINT: as above
+    KSValue(Array value) : data_(std::move(value)) {}               // NOLINT: as above
+    KSValue(Dictionary value) : data_(std::move(value)) {}          // NOLINT: as above
 
     bool isNull() const { return std::holds_alternative<std::monostate>(data_); }
     std::optional<bool> asBool() const { return read<bool>(); }
@@ -61,7 +61,7 @@ class KSValue {
 
     friend bool operator==(const KSValue&, const KSValue&) = default;
 
- private:
+  private:
     template <class T>
     std::optional<T> read() const {
         const T* value = std::get_if<T>(&data_);

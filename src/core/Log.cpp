@@ -17,11 +17,16 @@ constexpr std::size_t kLongestLine = 8192;
 
 spdlog::level::level_enum spdlogLevel(LogLevel level) {
     switch (level) {
-        case LogLevel::debug: return spdlog::level::debug;
-        case LogLevel::info: return spdlog::level::info;
-        case LogLevel::warning: return spdlog::level::warn;
-        case LogLevel::error: return spdlog::level::err;
-        case LogLevel::off: break;
+        case LogLevel::debug:
+            return spdlog::level::debug;
+        case LogLevel::info:
+            return spdlog::level::info;
+        case LogLevel::warning:
+            return spdlog::level::warn;
+        case LogLevel::error:
+            return spdlog::level::err;
+        case LogLevel::off:
+            break;
     }
     return spdlog::level::off;
 }
@@ -29,10 +34,14 @@ spdlog::level::level_enum spdlogLevel(LogLevel level) {
 /// The journal reads the level from "<N>" at a line's start (sd-daemon(3)).
 const char* journalPrefix(spdlog::level::level_enum level) {
     switch (level) {
-        case spdlog::level::err: return "<3>";
-        case spdlog::level::warn: return "<4>";
-        case spdlog::level::info: return "<6>";
-        default: return "<7>";
+        case spdlog::level::err:
+            return "<3>";
+        case spdlog::level::warn:
+            return "<4>";
+        case spdlog::level::info:
+            return "<6>";
+        default:
+            return "<7>";
     }
 }
 

@@ -8,7 +8,7 @@ namespace keepsakes {
 /// What another thread signals when its part is done. Timed waits go through `Clock::wait`.
 /// A copy is the same semaphore. Any thread may call it.
 class Semaphore {
- public:
+  public:
     Semaphore();
 
     void signal();
@@ -16,7 +16,7 @@ class Semaphore {
     /// Waits, without a limit, for a signal.
     void wait();
 
- private:
+  private:
     friend class Clock;
     struct Waiter;
     struct State;

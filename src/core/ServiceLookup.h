@@ -10,14 +10,14 @@ struct PlatformServices;
 
 /// The base of everything that the registry holds.
 class KSService {
- public:
+  public:
     virtual ~KSService() = default;
 };
 
 /// How one service finds another, by name, in its own initialiser and only what was made before
 /// it. The registry implements it; services never see the registry itself.
 class ServiceLookup {
- public:
+  public:
     virtual ~ServiceLookup() = default;
 
     /// The service of that name; a name without a service fails the assertion

@@ -14,14 +14,14 @@ using Task = std::function<void()>;
 /// queue that blocks never starves another; a thread with nothing to do ends after half a minute.
 /// One for the process; any thread may call it.
 class WorkerThreads {
- public:
+  public:
     static WorkerThreads& shared();
 
     /// Runs `task` on a thread of its own for as long as it takes.
     void run(Task task);
 
-    /// Returns when every borrowed thread is done or waits (see `beginWaiting`). For tests that drive a
-    /// virtual clock: nothing more happens then until time passes or somebody asks.
+    /// Returns when every borrowed thread is done or waits (see `beginWaiting`). For tests that
+    /// drive a virtual clock: nothing more happens then until time passes or somebody asks.
     void settle();
 
     /// Ends idle threads and waits for those at work. After it, `run` starts threads anew.
@@ -35,7 +35,7 @@ class WorkerThreads {
     WorkerThreads(const WorkerThreads&) = delete;
     WorkerThreads& operator=(const WorkerThreads&) = delete;
 
- private:
+  private:
     struct State;
     WorkerThreads();
     ~WorkerThreads();
@@ -48,7 +48,7 @@ class WorkerThreads {
 /// happens on the queue itself. An exception that leaves a task is logged as an error and goes no
 /// further.
 class WorkQueue {
- public:
+  public:
     explicit WorkQueue(std::string label);
     ~WorkQueue();
     WorkQueue(const WorkQueue&) = delete;
@@ -68,7 +68,7 @@ class WorkQueue {
     /// An appender that outlives the queue: a task given to it after the queue's end is dropped.
     std::function<void(Task)> detachedAppender() const;
 
- private:
+  private:
     struct State;
     std::shared_ptr<State> state_;
 };

@@ -10,7 +10,7 @@ namespace keepsakes {
 /// Takes events for the owner's own records. Any thread may call it; it never blocks its caller and
 /// never fails: what cannot be kept is dropped and counted.
 class AnalyticsService {
- public:
+  public:
     virtual ~AnalyticsService() = default;
     virtual void send(std::string_view event, const KSDictionary& fields) = 0;
 };

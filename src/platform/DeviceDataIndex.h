@@ -10,15 +10,15 @@ namespace keepsakes {
 
 /// What the last scan left behind.
 struct ScanReport {
-    bool complete = false;            ///< False when the scan was given up on or could not run.
-    std::uint64_t filesIndexed = 0;   ///< Files that the index holds records or a state of.
-    std::uint64_t filesRefused = 0;   ///< Files of these that were passed over.
+    bool complete = false;              ///< False when the scan was given up on or could not run.
+    std::uint64_t filesIndexed = 0;     ///< Files that the index holds records or a state of.
+    std::uint64_t filesRefused = 0;     ///< Files of these that were passed over.
     std::vector<std::string> problems;  ///< What the owner should know, a line each, newest first.
 };
 
 /// The index of the owner's files, brought up to date before data is asked for.
 class DeviceDataIndex {
- public:
+  public:
     using Progress = std::function<void(std::uint64_t done, std::uint64_t total)>;
 
     virtual ~DeviceDataIndex() = default;

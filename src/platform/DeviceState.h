@@ -7,7 +7,7 @@ namespace keepsakes {
 
 /// The owner's two opt-ins. Any thread may ask.
 class DevicePolicy {
- public:
+  public:
     virtual ~DevicePolicy() = default;
     virtual bool diagnosticSubmissionAllowed() const = 0;
     virtual bool healthDataSubmissionAllowed() const = 0;
@@ -15,7 +15,7 @@ class DevicePolicy {
 
 /// Whether the device keeps its files locked until the owner's first unlock, and its lock state.
 class LockState {
- public:
+  public:
     virtual ~LockState() = default;
     virtual bool formattedForContentProtection() const = 0;
     virtual bool unlockedSinceBoot() const = 0;

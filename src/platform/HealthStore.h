@@ -31,7 +31,7 @@ struct DateComponents {
 /// The health store: recorded workouts, and what the owner says of himself or herself.
 /// Any thread may call it. A failed call changes nothing and may be tried again.
 class HealthStore {
- public:
+  public:
     using Workouts = std::expected<std::vector<WorkoutSample>, KSError>;
 
     virtual ~HealthStore() = default;

@@ -41,7 +41,7 @@ inline constexpr std::string_view kKSKeyVenue = "venue";
 /// The photo analysis service: groups of photos recognised as one occasion. Any thread may call it;
 /// both questions block the caller and change nothing.
 class PhotoAnalysis {
- public:
+  public:
     using Summary = std::expected<KSDictionary, KSError>;
 
     static constexpr std::size_t kMostIdentifiers = 50;

@@ -11,7 +11,7 @@ namespace keepsakes {
 /// The user defaults store: settings by domain and key that programs other than the daemon may
 /// write. Any thread may call it; every read sees what was written last, by whomever.
 class UserDefaults {
- public:
+  public:
     virtual ~UserDefaults() = default;
 
     /// Null when there is none, or when the domain cannot be read (which is logged once).

@@ -26,8 +26,7 @@ std::vector<std::string> RecordedAssertions::take() {
     const std::lock_guard lock(state_->mutex);
     std::vector<std::string> texts;
     for (const auto& failure : std::exchange(state_->failures, {})) {
-        texts.push_back(
-            fmt::format("{} ({}:{})", failure.description, failure.unit, failure.line));
+        texts.push_back(fmt::format("{} ({}:{})", failure.description, failure.unit, failure.line));
     }
     return texts;
 }

@@ -11,7 +11,7 @@ namespace keepsakes {
 
 /// Collects the assertion failures of a test while it lives, in place of the handler before it.
 class RecordedAssertions {
- public:
+  public:
     RecordedAssertions();
     ~RecordedAssertions();
     RecordedAssertions(const RecordedAssertions&) = delete;
@@ -23,7 +23,7 @@ class RecordedAssertions {
     /// As `take`, the descriptions alone.
     std::vector<std::string> takeDescriptions();
 
- private:
+  private:
     struct State;
     std::shared_ptr<State> state_;
     KSAssertionHandler before_;

@@ -8,7 +8,7 @@ namespace keepsakes {
 
 /// A folder of the test's own, removed with all it holds when the test ends.
 class TemporaryFolder {
- public:
+  public:
     TemporaryFolder();
     ~TemporaryFolder();
     TemporaryFolder(const TemporaryFolder&) = delete;
@@ -20,7 +20,7 @@ class TemporaryFolder {
     /// Writes a file below the folder, making the folders above it.
     std::filesystem::path write(std::string_view name, std::string_view content) const;
 
- private:
+  private:
     std::filesystem::path path_;
 };
 

@@ -14,7 +14,7 @@ namespace keepsakes {
 /// A clock that stands still until a test moves it. `advance` fires what is due in order, letting
 /// the queues come to rest after each, so that a run is the same every time.
 class VirtualClock final : public Clock {
- public:
+  public:
     explicit VirtualClock(KSDate start = {700000000});
 
     KSDate now() const override;
@@ -28,10 +28,10 @@ class VirtualClock final : public Clock {
     /// How many delayed calls and timed waits are pending.
     std::size_t pendingCount() const;
 
- protected:
+  protected:
     std::function<void()> schedule(double delaySeconds, std::function<void()> fire) override;
 
- private:
+  private:
     struct State {
         std::mutex mutex;
         double uptime = 0;
