@@ -1,12 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "core/Calendar.h"
 
+#include <unicode/basictz.h>
 #include <unicode/calendar.h>
 #include <unicode/datefmt.h>
 #include <unicode/gregocal.h>
 #include <unicode/smpdtfmt.h>
 #include <unicode/timezone.h>
 
+#include <chrono>
 #include <cmath>
 #include <memory>
 #include <stdexcept>
@@ -71,9 +73,13 @@ int yearsBetween(KSDate from, KSDate to) {
 }
 
 std::optional<KSDate> dateOfDay(int year, int month, int day) {
+    const std::chrono::year_month_day numbers{std::chrono::year(year),
+                                              std::chrono::month(static_cast<unsigned>(month)),
+                                              std::chrono::day(static_cast<unsigned>(day))};
+    if (month < 1 || day < 1 || !numbers.ok()) return std::nullopt;
+    // Not ICU's strict mode, which also refuses a day whose midnight is skipped.
     UErrorCode status = U_ZERO_ERROR;
     icu::GregorianCalendar calendar(status);
-    calendar.setLenient(false);
     calendar.clear();
     calendar.set(year, month - 1, day);
     const UDate midnight = calendar.getTime(status);
@@ -95,7 +101,11 @@ KSDate fromLocal(KSDate local) {
     std::int32_t raw = 0;
     std::int32_t saving = 0;
     UErrorCode status = U_ZERO_ERROR;
-    zone->getOffset(toICU(local), 1, raw, saving, status);
+    // Every zone of ICU's own is a basic one.
+    const auto* basic = dynamic_cast<const icu::BasicTimeZone*>(zone.get());
+    if (!basic) return local;
+    basic->getOffsetFromLocal(toICU(local), UCAL_TZ_LOCAL_FORMER, UCAL_TZ_LOCAL_FORMER, raw, saving,
+                              status);
     return U_SUCCESS(status) ? local - (raw + saving) / 1000 : local;
 }
 

@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <system_error>
 
 namespace keepsakes {
@@ -70,11 +71,10 @@ std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
 }
 
 OptionalError replaceFile(const std::filesystem::path& path, std::string_view content) {
-    auto beside = path;
-    beside += ".new";
+    // A name of its own: two writers at once must not mix their contents.
+    std::string beside = path.string() + ".XXXXXX";
     {
-        const Descriptor file(
-            ::open(beside.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600));
+        const Descriptor file(::mkostemp(beside.data(), O_CLOEXEC));
         if (file.get() < 0) return posixError(errno, "create", beside);
         if (!writeAll(file.get(), content) || ::fsync(file.get()) != 0) {
             const int code = errno;
@@ -82,7 +82,11 @@ OptionalError replaceFile(const std::filesystem::path& path, std::string_view co
             return posixError(code, "write", beside);
         }
     }
-    if (::rename(beside.c_str(), path.c_str()) != 0) return posixError(errno, "replace", path);
+    if (::rename(beside.c_str(), path.c_str()) != 0) {
+        const int code = errno;
+        ::unlink(beside.c_str());
+        return posixError(code, "replace", path);
+    }
     return std::nullopt;
 }
 

@@ -83,8 +83,10 @@ std::optional<std::string> jsonText(const KSValue& value) {
 
 std::optional<KSValue> parseJson(std::string_view text) {
     bool tooDeep = false;
-    const auto limitDepth = [&tooDeep](int depth, json::parse_event_t, json&) {
-        tooDeep |= depth > kDeepest;
+    const auto limitDepth = [&tooDeep](int depth, json::parse_event_t event, json&) {
+        const bool opens =
+            event == json::parse_event_t::array_start || event == json::parse_event_t::object_start;
+        tooDeep |= opens && depth >= kDeepest;
         return !tooDeep;
     };
     try {

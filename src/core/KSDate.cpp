@@ -79,7 +79,8 @@ std::optional<TimeOfDay> readTime(Cursor& in) {
             time.fraction = *fraction;
         }
     }
-    if (time.hour == 24 && (time.minute != 0 || time.second != 0)) return std::nullopt;
+    const bool pastTheHour = time.minute != 0 || time.second != 0 || time.fraction != 0;
+    if (time.hour == 24 && pastTheHour) return std::nullopt;
     return time;
 }
 
@@ -136,11 +137,11 @@ std::optional<ParsedDate> parseISO8601(std::string_view text) {
 
 std::string formatISO8601(KSDate date) {
     namespace chr = std::chrono;
-    constexpr double kYear1 = -62135596800.0;
-    constexpr double kYear10000 = 253402300800.0;
-    const double unixSeconds = date.unixSeconds();
-    if (!(unixSeconds >= kYear1 && unixSeconds < kYear10000 - 1)) return "invalid";
-    const auto total = static_cast<std::int64_t>(std::llround(unixSeconds * 1000));
+    constexpr double kYear1 = -62135596800000.0;  // in milliseconds
+    constexpr double kYear10000 = 253402300800000.0;
+    const double rounded = std::round(date.unixSeconds() * 1000);
+    if (!(rounded >= kYear1 && rounded < kYear10000)) return "invalid";
+    const auto total = static_cast<std::int64_t>(rounded);
     const chr::sys_time<chr::milliseconds> instant{chr::milliseconds(total)};
     const auto midnight = chr::floor<chr::days>(instant);
     const chr::year_month_day ymd(midnight);

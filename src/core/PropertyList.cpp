@@ -8,6 +8,7 @@
 #include <cmath>
 #include <pugixml.hpp>
 #include <sstream>
+#include <vector>
 
 #include "core/Files.h"
 
@@ -52,6 +53,19 @@ std::optional<KSValue::Bytes> fromBase64(std::string_view text) {
     return bytes;
 }
 
+std::string replaceAll(std::string_view text, char character, std::string_view replacement) {
+    std::string result;
+    result.reserve(text.size());
+    for (const char c : text) {
+        if (c == character) {
+            result += replacement;
+        } else {
+            result += c;
+        }
+    }
+    return result;
+}
+
 void appendNode(pugi::xml_node parent, const KSValue& value);
 
 struct AppendNode {
@@ -59,7 +73,9 @@ struct AppendNode {
 
     void text(const char* name, const std::string& content) {
         auto node = parent.append_child(name);
-        node.append_child(pugi::node_pcdata).set_value(content.c_str());
+        if (content.empty()) return;
+        node.append_child(pugi::node_pcdata)
+            .set_value(replaceAll(content, '\0', "\xef\xbf\xbd").c_str());
     }
     void operator()(std::monostate) {}
     void operator()(bool value) { parent.append_child(value ? "true" : "false"); }
@@ -102,39 +118,83 @@ std::optional<Number> parseNumber(std::string_view text) {
     return error == std::errc{} && rest == end ? std::optional(number) : std::nullopt;
 }
 
+constexpr std::string_view kBlank = " \t\r\n";
+
+std::string_view trimmed(std::string_view text) {
+    const auto first = text.find_first_not_of(kBlank);
+    if (first == std::string_view::npos) return {};
+    return text.substr(first, text.find_last_not_of(kBlank) - first + 1);
+}
+
+/// All the text in a node, which holds nothing else.
+std::expected<std::string, KSError> textOf(const pugi::xml_node& node) {
+    std::string text;
+    for (const auto& child : node.children()) {
+        if (child.type() != pugi::node_pcdata && child.type() != pugi::node_cdata) {
+            return badNode(node);
+        }
+        text += child.value();
+    }
+    return text;
+}
+
+/// The elements in a node, which holds nothing else but blanks.
+std::expected<std::vector<pugi::xml_node>, KSError> elementsOf(const pugi::xml_node& node) {
+    std::vector<pugi::xml_node> elements;
+    for (const auto& child : node.children()) {
+        if (child.type() == pugi::node_element) {
+            elements.push_back(child);
+        } else if (!trimmed(child.value()).empty()) {
+            return badNode(node);
+        }
+    }
+    return elements;
+}
+
 std::expected<KSValue, KSError> readNode(const pugi::xml_node& node, int depth);
 
 std::expected<KSValue, KSError> readDictionary(const pugi::xml_node& node, int depth) {
+    const auto elements = elementsOf(node);
+    if (!elements) return std::unexpected(elements.error());
     KSDictionary dictionary;
-    for (auto child = node.first_child(); child; child = child.next_sibling()) {
-        if (std::string_view(child.name()) != "key") return badNode(child);
-        const std::string key = child.text().get();
-        child = child.next_sibling();
-        if (!child) return failure(1, fmt::format("property list: key {} has no value", key));
-        auto value = readNode(child, depth + 1);
+    for (std::size_t i = 0; i < elements->size(); i += 2) {
+        const auto& element = (*elements)[i];
+        if (std::string_view(element.name()) != "key") return badNode(element);
+        const auto key = textOf(element);
+        if (!key) return std::unexpected(key.error());
+        if (i + 1 == elements->size()) {
+            return failure(1, fmt::format("property list: key {} has no value", *key));
+        }
+        auto value = readNode((*elements)[i + 1], depth + 1);
         if (!value) return value;
-        dictionary.insert_or_assign(key, std::move(*value));
+        dictionary.insert_or_assign(*key, std::move(*value));
     }
     return dictionary;
+}
+
+std::expected<KSValue, KSError> readArray(const pugi::xml_node& node, int depth) {
+    const auto elements = elementsOf(node);
+    if (!elements) return std::unexpected(elements.error());
+    KSArray array;
+    for (const auto& element : *elements) {
+        auto value = readNode(element, depth + 1);
+        if (!value) return value;
+        array.push_back(std::move(*value));
+    }
+    return array;
 }
 
 std::expected<KSValue, KSError> readNode(const pugi::xml_node& node, int depth) {
     if (depth > kDeepest) return failure(1, "property list: nested too deeply");
     const std::string_view kind = node.name();
-    const std::string_view text = node.text().get();
     if (kind == "dict") return readDictionary(node, depth);
-    if (kind == "array") {
-        KSArray array;
-        for (const auto& child : node.children()) {
-            auto value = readNode(child, depth + 1);
-            if (!value) return value;
-            array.push_back(std::move(*value));
-        }
-        return array;
-    }
-    if (kind == "string") return KSValue(text);
+    if (kind == "array") return readArray(node, depth);
     if (kind == "true") return KSValue(true);
     if (kind == "false") return KSValue(false);
+    auto content = textOf(node);
+    if (!content) return std::unexpected(std::move(content.error()));
+    if (kind == "string") return KSValue(std::move(*content));
+    const auto text = trimmed(*content);
     if (kind == "integer") {
         if (auto number = parseNumber<std::int64_t>(text)) return KSValue(*number);
     } else if (kind == "real") {
@@ -159,18 +219,22 @@ std::string propertyListText(const KSDictionary& root) {
     appendNode(plist, root);
     std::ostringstream out;
     document.save(out, "\t");
-    return out.str();
+    // The only carriage returns are those in texts; unescaped, a reader takes them for line ends.
+    return replaceAll(out.str(), '\r', "&#13;");
 }
 
 std::expected<KSDictionary, KSError> parsePropertyList(std::string_view text) {
     pugi::xml_document document;
-    const auto result = document.load_buffer(text.data(), text.size());
+    // Blanks between elements are skipped here: the parser would drop texts that are only blanks.
+    const auto result =
+        document.load_buffer(text.data(), text.size(), pugi::parse_default | pugi::parse_ws_pcdata);
     if (!result) {
         return failure(
             1, fmt::format("property list: {} at byte {}", result.description(), result.offset));
     }
-    const auto root = document.child("plist").first_child();
-    auto value = readNode(root, 0);
+    const auto roots = elementsOf(document.child("plist"));
+    if (!roots || roots->size() != 1) return failure(1, "property list: not one root");
+    auto value = readNode(roots->front(), 0);
     if (!value) return std::unexpected(std::move(value.error()));
     if (const auto* dictionary = value->asDictionary()) return *dictionary;
     return failure(1, "property list: the root is not a dictionary");

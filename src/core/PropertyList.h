@@ -14,7 +14,7 @@ namespace keepsakes {
 
 /// XML property lists (the public DTD "PropertyList 1.0") as a codec of `KSValue`. Identifiers are
 /// written as strings; dates keep whole seconds. Null has no form and is left out of dictionaries
-/// and arrays.
+/// and arrays; nor has the null character, which U+FFFD stands for.
 std::string propertyListText(const KSDictionary& root);
 
 /// Reads a list whose root is a dictionary. The error says where the text stops making sense.
