@@ -10,6 +10,7 @@
 #include <cmath>
 #include <exception>
 #include <map>
+#include <memory>
 #include <mutex>
 #include <string_view>
 #include <system_error>
@@ -39,10 +40,20 @@ void prepareLibrary() {
     });
 }
 
+// The library's interface is of the days of std::auto_ptr.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wdeprecated-declarations"
+
+template <typename Image>
+std::unique_ptr<Exiv2::Image> makeImage(int fd, std::int64_t size) {
+    return std::make_unique<Image>(Exiv2::BasicIo::AutoPtr(new DescriptorIo(fd, size)), false);
+}
+
+#pragma GCC diagnostic pop
+
 /// What kinds an image may be is decided by `kindOf`, not by the library's own guess, which knows
 /// many formats more.
-Exiv2::Image::AutoPtr openImage(int fd, std::int64_t size) {
-    const auto io = [fd, size] { return Exiv2::BasicIo::AutoPtr(new DescriptorIo(fd, size)); };
+std::unique_ptr<Exiv2::Image> openImage(int fd, std::int64_t size) {
     std::array<std::byte, kHeadSize> head{};
     const auto count = DescriptorIo(fd, size).read(
         reinterpret_cast<Exiv2::byte*>(head.data()),  // NOLINT: bytes as the library has them
@@ -52,11 +63,11 @@ Exiv2::Image::AutoPtr openImage(int fd, std::int64_t size) {
     }
     switch (std::to_integer<unsigned>(head[0])) {
         case 0xFF:
-            return Exiv2::Image::AutoPtr(new Exiv2::JpegImage(io(), false));
+            return makeImage<Exiv2::JpegImage>(fd, size);
         case 0x89:
-            return Exiv2::Image::AutoPtr(new Exiv2::PngImage(io(), false));
+            return makeImage<Exiv2::PngImage>(fd, size);
         default:
-            return Exiv2::Image::AutoPtr(new Exiv2::BmffImage(io(), false));
+            return makeImage<Exiv2::BmffImage>(fd, size);
     }
 }
 
