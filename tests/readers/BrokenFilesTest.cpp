@@ -90,6 +90,10 @@ TEST(BrokenFiles, AreRefusedWithTheReason) {
     early.time = "1980:01:01 00:00:00";
     SampleMetadata never = everyField();
     never.time = "    :  :     :  :  ";
+    const std::string heif(
+        "\0\0\0\x14"
+        "ftypmif1\0\0\0\0mif1",
+        20);
     std::string manyTracks = "<gpx>";
     for (int i = 0; i <= 10000; ++i) {
         manyTracks +=
@@ -113,6 +117,12 @@ TEST(BrokenFiles, AreRefusedWithTheReason) {
          "no timestamp can be read"},
         {manyTracks + "</gpx>", "more than 10000 workouts"},
         {photo(SampleMetadata{}), "no capture time"},
+        {heif + std::string("\x7F\xFF\xFF\xFFmeta", 8), "the meta box is too large"},
+        {heif + std::string("\0\0\0\0mdat", 8), "no meta box"},
+        {heif + std::string("\0\0\0\x2Cmeta\0\0\0\0\0\0\0\x0Eiinf\0\0\0\0\0\0"
+                            "\0\0\0\x12iloc\2\0\0\0\0\0\xFF\xFF\xFF\xFF",
+                            44),
+         "a box ends within a field"},
         {photo(never), "no capture time"},
         {photo(early), "1979-12-31T22:00:00Z as capture time is not believed"},
     };

@@ -75,8 +75,9 @@ TEST_F(PhotoReader, ReadsEveryImageForm) {
     auto metadata = taken();
     metadata.latitude = "47/1 30/1 0/1";
     metadata.longitude = "15/1 0/1 3600/100";
+    metadata.xmp = bag("dc:subject", "Strand");
     for (const auto form : {ImageForm::jpeg, ImageForm::png, ImageForm::heif}) {
-        EXPECT_EQ(told(readBytes(photo(metadata, form))), kTaken + ", at 47.5000 15.0100\n");
+        EXPECT_EQ(told(readBytes(photo(metadata, form))), kTaken + ", at 47.5000 15.0100, beach\n");
     }
 }
 

@@ -82,23 +82,31 @@ std::string box(std::string_view type, const std::string& content) {
     return number(content.size() + 8, 4) + std::string(type) + content;
 }
 
-/// ISO/IEC 14496-12: one item of type Exif, which lies in the mdat at the end.
-std::string heif(const Exiv2::ExifData& exif) {
+/// ISO/IEC 14496-12: an item of type Exif in the mdat at the end, one of XMP in the idat.
+std::string heif(const Exiv2::ExifData& exif, const std::string& xmp) {
     const std::string fullBox(4, '\0');
+    const std::string zero(1, '\0');
     Exiv2::Blob blob;
     Exiv2::ExifParser::encode(blob, Exiv2::littleEndian, exif);
     const std::string item =
         number(6, 4) + std::string("Exif\0\0", 6) + std::string(blob.begin(), blob.end());
     const auto ftyp = box("ftyp", "heic" + number(0, 4) + "mif1heic");
+    const auto infe = [&](std::uint64_t id, const std::string& type) {
+        return box("infe", number(2U << 24U, 4) + number(id, 2) + number(0, 2) + type + zero);
+    };
+    const auto location = [&](std::uint64_t id, std::uint64_t method, std::uint64_t offset,
+                              std::uint64_t length) {
+        return number(id, 2) + number(method, 2) + number(0, 2) + number(1, 2) + number(offset, 4) +
+               number(length, 4);
+    };
     const auto metaOf = [&](std::size_t offset) {
-        const auto infe = box("infe", number(2U << 24U, 4) + number(1, 2) + number(0, 2) + "Exif" +
-                                          std::string(1, '\0'));
-        return box("meta",
-                   fullBox + box("hdlr", fullBox + number(0, 4) + "pict" + std::string(13, '\0')) +
-                       box("iinf", fullBox + number(1, 2) + infe) +
-                       box("iloc", fullBox + number(0x4400, 2) + number(1, 2) + number(1, 2) +
-                                       number(0, 2) + number(1, 2) + number(offset, 4) +
-                                       number(item.size(), 4)));
+        return box("meta", fullBox +
+                               box("iinf", fullBox + number(2, 2) + infe(1, "Exif") +
+                                               infe(2, "mime" + zero + "application/rdf+xml")) +
+                               box("iloc", number(1U << 24U, 4) + number(0x4400, 2) + number(2, 2) +
+                                               location(1, 0, offset, item.size()) +
+                                               location(2, 1, 0, xmp.size())) +
+                               box("idat", xmp));
     };
     const auto start = ftyp.size() + metaOf(0).size() + 8;
     return ftyp + metaOf(start) + box("mdat", item);
@@ -149,7 +157,11 @@ std::string told(const std::expected<FileRecords, std::string>& records) {
 
 std::string photo(const SampleMetadata& metadata, ImageForm form) {
     const auto exif = exifOf(metadata);
-    if (form == ImageForm::heif) return heif(exif);
+    std::string xmp;
+    if (!metadata.xmp.empty()) {
+        xmp = std::string(kXmpHead) + metadata.xmp + std::string(kXmpTail);
+    }
+    if (form == ImageForm::heif) return heif(exif, xmp);
     const auto& pixel = form == ImageForm::jpeg ? kJpeg : kPng;
     // NOLINTNEXTLINE(cppcoreguidelines-pro-type-reinterpret-cast): bytes as the library has them
     const auto* data = reinterpret_cast<const Exiv2::byte*>(pixel.data());
@@ -161,8 +173,8 @@ std::string photo(const SampleMetadata& metadata, ImageForm form) {
         iptc["Iptc.Application2.Keywords"].setValue(metadata.keyword);
         image->setIptcData(iptc);
     }
-    if (!metadata.xmp.empty()) {
-        image->setXmpPacket(std::string(kXmpHead) + metadata.xmp + std::string(kXmpTail));
+    if (!xmp.empty()) {
+        image->setXmpPacket(xmp);
         image->writeXmpFromPacket(true);
     }
     image->writeMetadata();

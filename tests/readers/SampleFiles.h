@@ -32,7 +32,7 @@ struct SampleMetadata {
 
 enum class ImageForm { jpeg, png, heif };
 
-/// A tiny image with that metadata. HEIF holds the EXIF block alone.
+/// A tiny image with that metadata. HEIF holds no IPTC block.
 std::string photo(const SampleMetadata& metadata, ImageForm form = ImageForm::jpeg);
 
 }  // namespace keepsakes
