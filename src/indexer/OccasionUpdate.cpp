@@ -185,8 +185,8 @@ class Update {
         statement.exec();
     }
 
-    /// From the content of the first photo's file; copies of one file may have begun occasions that
-    /// were then parted, so the first free one is taken.
+    /// From the content of the first photo's file. Copies of one file may begin occasions that were
+    /// parted since: where it is taken, the file's number in the index makes another.
     std::string newIdentifier(std::uint32_t first) {
         hash_.reset();
         hash_.bind(1, rows_[first].file);
@@ -194,7 +194,9 @@ class Update {
         for (int attempt = 0;; ++attempt) {
             auto identifier = identifierOf("occasion\n" + hash + "\n" +
                                            std::to_string(rows_[first].number) + "\n" +
-                                           std::to_string(attempt))
+                                           (attempt == 0 ? std::string()
+                                                         : std::to_string(rows_[first].file) +
+                                                               "\n" + std::to_string(attempt)))
                                   .string();
             if (!identifiers_.contains(identifier)) return identifier;
         }
