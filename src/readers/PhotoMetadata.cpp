@@ -16,6 +16,7 @@
 
 #include "readers/DescriptorIo.h"
 #include "readers/FileReaders.h"
+#include "readers/HeifItems.h"
 #include "readers/ReaderLimits.h"
 #include "readers/TextFolding.h"
 
@@ -33,16 +34,48 @@ void prepareLibrary() {
     std::call_once(once, [] {
         static std::recursive_mutex toolkit;
         Exiv2::XmpParser::initialize(lockToolkit, &toolkit);
-        Exiv2::enableBMFF(true);
         // It would write to standard error whatever a stranger's file makes it say.
         Exiv2::LogMsg::setLevel(Exiv2::LogMsg::mute);
     });
 }
 
-/// What kinds an image may be is decided by `kindOf`, not by the library's own guess, which knows
-/// many formats more.
-Exiv2::Image::AutoPtr openImage(int fd, std::int64_t size) {
-    const auto io = [fd, size] { return Exiv2::BasicIo::AutoPtr(new DescriptorIo(fd, size)); };
+/// The metadata of one image.
+struct Blocks {
+    Exiv2::ExifData exif;
+    Exiv2::XmpData xmp;
+    Exiv2::IptcData iptc;
+};
+
+// The library's interface is of the days of std::auto_ptr.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wdeprecated-declarations"
+
+/// Reads with the class of one kind of image: the library's own guess knows many kinds more.
+template <typename Image>
+Blocks readImage(int fd, std::int64_t size) {
+    Image image(Exiv2::BasicIo::AutoPtr(new DescriptorIo(fd, size)), false);
+    image.readMetadata();
+    return {image.exifData(), image.xmpData(), image.iptcData()};
+}
+
+#pragma GCC diagnostic pop
+
+Blocks readHeif(int fd) {
+    const auto items = readHeifItems(fd);
+    if (!items) throw std::runtime_error(items.error());
+    Blocks blocks;
+    if (!items->exif.empty()) {
+        const std::vector<Exiv2::byte> tiff(items->exif.begin(), items->exif.end());
+        Exiv2::ExifParser::decode(blocks.exif, tiff.data(),
+                                  static_cast<std::uint32_t>(tiff.size()));
+    }
+    if (!items->xmp.empty() && Exiv2::XmpParser::decode(blocks.xmp, items->xmp) != 0) {
+        throw std::runtime_error("the XMP item cannot be read");
+    }
+    return blocks;
+}
+
+Blocks readBlocks(int fd, std::int64_t size) {
     std::array<std::byte, kHeadSize> head{};
     const auto count = DescriptorIo(fd, size).read(
         reinterpret_cast<Exiv2::byte*>(head.data()),  // NOLINT: bytes as the library has them
@@ -52,11 +85,11 @@ Exiv2::Image::AutoPtr openImage(int fd, std::int64_t size) {
     }
     switch (std::to_integer<unsigned>(head[0])) {
         case 0xFF:
-            return Exiv2::Image::AutoPtr(new Exiv2::JpegImage(io(), false));
+            return readImage<Exiv2::JpegImage>(fd, size);
         case 0x89:
-            return Exiv2::Image::AutoPtr(new Exiv2::PngImage(io(), false));
+            return readImage<Exiv2::PngImage>(fd, size);
         default:
-            return Exiv2::Image::AutoPtr(new Exiv2::BmffImage(io(), false));
+            return readHeif(fd);
     }
 }
 
@@ -292,16 +325,16 @@ class XmpBlock {
     std::string longitude_;
 };
 
-PhotoMetadata gather(const Exiv2::Image& image) {
+PhotoMetadata gather(const Blocks& blocks) {
     PhotoMetadata metadata;
-    const ExifBlock exif(image.exifData());
-    const XmpBlock xmp(image.xmpData());
+    const ExifBlock exif(blocks.exif);
+    const XmpBlock xmp(blocks.xmp);
     metadata.time = exif.time();
     if (!metadata.time) metadata.time = xmp.time();
     metadata.position = exif.position();
     if (!metadata.position) metadata.position = xmp.position();
     xmp.addNames(metadata);
-    for (const auto& entry : image.iptcData()) {
+    for (const auto& entry : blocks.iptc) {
         if (metadata.keywords.size() >= limits::kMostProperties) break;
         if (entry.key() == "Iptc.Application2.Keywords") {
             metadata.keywords.push_back(entry.toString());
@@ -322,9 +355,7 @@ std::expected<PhotoMetadata, std::string> readPhotoMetadata(int fd) {
     }
     try {
         prepareLibrary();
-        const auto image = openImage(fd, info.st_size);
-        image->readMetadata();
-        return gather(*image);
+        return gather(readBlocks(fd, info.st_size));
     } catch (const std::exception& error) {
         return std::unexpected(cleanText(error.what()));
     }

@@ -50,6 +50,9 @@ inline constexpr double kLongestWorkout = 31 * 86400.0;
 // Photos.
 
 inline constexpr std::uint64_t kLargestPhoto = std::uint64_t{256} * 1024 * 1024;
+/// Bytes of a HEIF file's table of items, and of one metadata item.
+inline constexpr std::uint64_t kLargestMetaBox = std::uint64_t{8} * 1024 * 1024;
+inline constexpr std::uint64_t kLargestItem = std::uint64_t{16} * 1024 * 1024;
 /// How far, in seconds, the camera's clock may be from a multiple of 15 minutes off GPS time for
 /// the zone to be told from it. Beyond it the clock is wrong or the fix is an old one.
 inline constexpr double kLargestClockError = 180;

@@ -16,11 +16,14 @@ constexpr double kShortestLeg = 5;    // seconds
 constexpr double kLongestLeg = 300;   // seconds
 constexpr double kSlowestMove = 0.5;  // m/s; slower is standing, with the receiver's noise
 
+/// Less of the measured time than this in movement is a day's log, not an activity.
+constexpr double kLeastMoving = 0.15;
+
 // Medians of moving speed, in m/s.
 constexpr double kFastestWalk = 2.0;     // 7.2 km/h
 constexpr double kFastestRun = 4.2;      // 15 km/h
 constexpr double kFastestRide = 12.5;    // 45 km/h
-constexpr double kFastestSprint = 16.0;  // 58 km/h, which a tenth of a car's time passes
+constexpr double kFastestSprint = 16.0;  // 58 km/h, for a tenth of the moving time
 
 /// Great-circle distance in metres on a sphere of the mean earth radius (haversine formula).
 double distanceBetween(const GeoPoint& a, const GeoPoint& b) {
@@ -53,6 +56,7 @@ void SpeedProfile::add(const TrackPoint& point) {
     const auto length = legLength(*from_, point);
     from_ = point;
     if (!length || duration < 0 || duration > kLongestLeg) return;
+    measured_ += duration;
     const double speed = *length / duration;
     if (speed < kSlowestMove) return;
     const auto bin = std::min(speed / kBinWidth, static_cast<double>(kBins - 1));
@@ -70,14 +74,19 @@ std::optional<double> SpeedProfile::quantile(double share) const {
     return static_cast<double>(kBins) * kBinWidth;
 }
 
+std::optional<double> SpeedProfile::movingShare() const {
+    return measured_ > 0 ? std::optional(moving_ / measured_) : std::nullopt;
+}
+
 std::optional<int> activityOfSpeed(const SpeedProfile& speed) {
-    const auto median = speed.quantile(0.5);
-    if (!median) return activityCode("Other");
-    if (*median < kFastestWalk) return activityCode("Walking");
-    if (*median < kFastestRun) return activityCode("Running");
-    if (*median < kFastestRide && *speed.quantile(0.9) < kFastestSprint) {
-        return activityCode("Cycling");
-    }
+    const auto moving = speed.movingShare();
+    if (!moving) return activityCode("Other");
+    if (*moving < kLeastMoving) return std::nullopt;
+    if (*speed.quantile(0.9) >= kFastestSprint) return std::nullopt;
+    const double median = *speed.quantile(0.5);
+    if (median < kFastestWalk) return activityCode("Walking");
+    if (median < kFastestRun) return activityCode("Running");
+    if (median < kFastestRide) return activityCode("Cycling");
     return std::nullopt;
 }
 

@@ -36,17 +36,22 @@ class SpeedProfile {
     /// nothing when nothing moved.
     std::optional<double> quantile(double share) const;
 
+    /// The share (0 to 1) of the measured time that was movement; nothing when no leg was measured.
+    std::optional<double> movingShare() const;
+
   private:
     static constexpr double kBinWidth = 0.1;
     static constexpr std::size_t kBins = 1000;
 
     std::optional<TrackPoint> from_;
     std::array<float, kBins> seconds_{};
-    double moving_ = 0;
+    double moving_ = 0;    // seconds
+    double measured_ = 0;  // seconds
 };
 
-/// The activity that a speed profile looks like, for a track without a type: Walking, Running,
-/// Cycling, nothing for a vehicle, Other when nothing moved.
+/// The activity that a speed profile looks like, for a track without a type: Walking, Running or
+/// Cycling; nothing for a vehicle and for the log of a day that was mostly spent in one place;
+/// Other when no speed can be told.
 std::optional<int> activityOfSpeed(const SpeedProfile& speed);
 
 /// Gathers one track or activity while it is read, in flat memory.

@@ -1,0 +1,106 @@
+// SPDX-License-Identifier: Apache-2.0
+// Reads a GPX file of 500 MB and prints the pace beside that of only reading its bytes, and the
+// peak of resident memory. The file is made in the folder for temporary files and removed.
+#include <fcntl.h>
+#include <fmt/core.h>
+#include <sys/resource.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <vector>
+
+#include "readers/FileReaders.h"
+#include "readers/ReaderLimits.h"
+#include "readers/XmlStream.h"
+
+namespace {
+
+using namespace keepsakes;
+
+constexpr double kMegabyte = 1e6;
+constexpr double kFileSize = 500 * kMegabyte;
+constexpr double kLeastPace = 50;  // MB/s
+
+/// Points as watches write them: a second and some metres apart, in tracks of three hours; every
+/// second track without a type, so that its speed is measured.
+void makeFile(const std::filesystem::path& path) {
+    std::ofstream file(path);
+    file << "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<gpx version=\"1.1\" "
+            "xmlns=\"http://www.topografix.com/GPX/1/1\">\n";
+    auto time = parseISO8601("2010-01-01T00:00:00Z")->date;
+    double written = 0;
+    for (int track = 0; written < kFileSize; ++track) {
+        file << "<trk><name>Track</name>" << (track % 2 == 0 ? "<type>running</type>" : "")
+             << "<trkseg>\n";
+        for (int i = 0; i < 3 * 3600; ++i) {
+            const auto point = fmt::format(
+                "<trkpt lat=\"{:.7f}\" lon=\"15.4312345\"><ele>412.2</ele><time>{}</time>"
+                "<extensions><gpxtpx:TrackPointExtension><gpxtpx:hr>141</gpxtpx:hr>"
+                "</gpxtpx:TrackPointExtension></extensions></trkpt>\n",
+                47 + i * 2.5e-5, formatISO8601(time));
+            file << point;
+            written += static_cast<double>(point.size());
+            time = time + 1;
+        }
+        file << "</trkseg></trk>\n";
+    }
+    file << "</gpx>\n";
+}
+
+double seconds(const auto& work) {
+    const auto start = std::chrono::steady_clock::now();
+    work();
+    return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+}
+
+long peakKiB() {
+    rusage usage{};
+    ::getrusage(RUSAGE_SELF, &usage);
+    return usage.ru_maxrss;
+}
+
+}  // namespace
+
+int main() {
+    auto folder = (std::filesystem::temp_directory_path() / "trackbench.XXXXXX").string();
+    if (!::mkdtemp(folder.data())) return 1;
+    const auto path = std::filesystem::path(folder) / "large.gpx";
+    makeFile(path);
+    const auto megabytes = static_cast<double>(std::filesystem::file_size(path)) / kMegabyte;
+    const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
+
+    const auto readBytes = [fd] {
+        auto read = readDescriptor(fd);
+        std::vector<char> block(limits::kBlockSize);
+        while (read(block).value_or(0) > 0) {
+        }
+    };
+    readBytes();  // The file is then cached for both.
+    const double bytesOnly = seconds(readBytes);
+    const long before = peakKiB();
+    std::size_t workouts = 0;
+    std::string error;
+    const double parsed = seconds([fd, &workouts, &error] {
+        const auto records = readTrackFile(fd, {parseISO8601("2024-06-16")->date});
+        workouts = records ? records->workouts.size() : 0;
+        error = records ? "" : records.error();
+    });
+    ::close(fd);
+    std::filesystem::remove_all(folder);
+
+    const double pace = megabytes / parsed;
+    fmt::print("{:.0f} MB, {} workouts{}{}\n", megabytes, workouts, error.empty() ? "" : ", error ",
+               error);
+    fmt::print("bytes only  {:7.3f} s  {:6.0f} MB/s\n", bytesOnly, megabytes / bytesOnly);
+    fmt::print(
+        "as a track  {:7.3f} s  {:6.0f} MB/s  {:.1f} x the limit of {:.0f} MB/s, {:.1f} x "
+        "the time of the bytes\n",
+        parsed, pace, pace / kLeastPace, kLeastPace, parsed / bytesOnly);
+    fmt::print("peak memory {} KiB before, {} KiB after\n", before, peakKiB());
+    return error.empty() && workouts > 0 ? 0 : 1;
+}

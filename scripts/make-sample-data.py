@@ -1,0 +1,280 @@
+#!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
+"""Makes data/sample: the tracks and photos of an invented week that ends on Sunday, 2024-06-16.
+
+Needs the exiv2 command line tool. The same call makes the same bytes.
+
+    scripts/make-sample-data.py [FOLDER]     (default: data/sample beside this script's folder)
+
+The owner lives in Graz (Europe/Vienna, UTC+2 that week):
+  Wednesday  a run (TCX), with photos of the baby and the dog on the way
+  Thursday   a bike ride (GPX without a type)
+  Friday     a birthday party in the evening
+  Saturday   a hike (GPX), with photos
+and two files that cannot be read: a GPX file cut in the middle, a photo without a date.
+"""
+
+import math
+import struct
+import subprocess
+import sys
+import zlib
+from datetime import datetime, timedelta
+from pathlib import Path
+
+LOCAL_OFFSET = timedelta(hours=2)
+HOME = (47.0790, 15.4500)
+SUMMIT = (47.2040, 15.4660)
+METRES_PER_DEGREE = 111195.0
+
+
+def utc(text):
+    return datetime.fromisoformat(text)
+
+
+def iso(time):
+    return time.strftime("%Y-%m-%dT%H:%M:%SZ")
+
+
+# Tracks
+
+
+def walk(start, end, begin, metres_per_second, every):
+    """(time, latitude, longitude, elevation) from start to end, on a winding way north and back."""
+    total = (end - start).total_seconds()
+    points = []
+    seconds = 0
+    while seconds <= total:
+        there = min(seconds, total - seconds) * metres_per_second
+        latitude = begin[0] + there / METRES_PER_DEGREE
+        longitude = begin[1] + 0.0004 * math.sin(there / 150.0)
+        elevation = 400 + there * 0.12
+        points.append((start + timedelta(seconds=seconds), latitude, longitude, elevation))
+        seconds += every
+    return points
+
+
+def gpx(name, kind, points):
+    lines = [
+        '<?xml version="1.0" encoding="UTF-8"?>',
+        '<gpx version="1.1" creator="make-sample-data" xmlns="http://www.topografix.com/GPX/1/1">',
+        "  <trk>",
+        f"    <name>{name}</name>",
+    ]
+    if kind:
+        lines.append(f"    <type>{kind}</type>")
+    lines.append("    <trkseg>")
+    for time, latitude, longitude, elevation in points:
+        lines.append(
+            f'      <trkpt lat="{latitude:.6f}" lon="{longitude:.6f}"><ele>{elevation:.0f}</ele>'
+            f"<time>{iso(time)}</time></trkpt>"
+        )
+    lines += ["    </trkseg>", "  </trk>", "</gpx>", ""]
+    return "\n".join(lines)
+
+
+def tcx(sport, points):
+    start = points[0][0]
+    seconds = (points[-1][0] - start).total_seconds()
+    lines = [
+        '<?xml version="1.0" encoding="UTF-8"?>',
+        '<TrainingCenterDatabase xmlns="http://www.garmin.com/xmlschemas/'
+        'TrainingCenterDatabase/v2">',
+        f'  <Activities><Activity Sport="{sport}">',
+        f"    <Id>{iso(start)}</Id>",
+        f'    <Lap StartTime="{iso(start)}">',
+        f"      <TotalTimeSeconds>{seconds:.0f}</TotalTimeSeconds>",
+        "      <Intensity>Active</Intensity><TriggerMethod>Manual</TriggerMethod>",
+        "      <Track>",
+    ]
+    for time, latitude, longitude, _ in points:
+        lines.append(
+            f"        <Trackpoint><Time>{iso(time)}</Time><Position>"
+            f"<LatitudeDegrees>{latitude:.6f}</LatitudeDegrees>"
+            f"<LongitudeDegrees>{longitude:.6f}</LongitudeDegrees></Position></Trackpoint>"
+        )
+    lines += ["      </Track>", "    </Lap>", "  </Activity></Activities>",
+              "</TrainingCenterDatabase>", ""]
+    return "\n".join(lines)
+
+
+def make_tracks(folder):
+    folder.mkdir(parents=True, exist_ok=True)
+    hike = walk(utc("2024-06-15T08:02:00"), utc("2024-06-15T10:31:00"), SUMMIT, 0.9, 60)
+    run = walk(utc("2024-06-12T16:30:00"), utc("2024-06-12T17:15:00"), HOME, 2.8, 30)
+    ride = walk(utc("2024-06-13T15:00:00"), utc("2024-06-13T16:20:00"), HOME, 6.0, 30)
+    hike_file = gpx("Rundweg", "hiking", hike)
+    (folder / "2024-06-15-hike.gpx").write_text(hike_file)
+    (folder / "2024-06-12-run.tcx").write_text(tcx("Running", run))
+    (folder / "2024-06-13-ride.gpx").write_text(gpx("Feierabendrunde", None, ride))
+    (folder / "2024-06-14-broken.gpx").write_text(hike_file[:1200])
+
+
+# Images: a gradient of 64 x 48 pixels, of a colour of its own for each photo.
+
+
+def png(seed):
+    rows = b""
+    for y in range(48):
+        row = bytearray([0])
+        for x in range(64):
+            row += bytes(((seed * 37 + 4 * x) % 256, (seed * 91 + 5 * y) % 256, 128))
+        rows += bytes(row)
+
+    def chunk(kind, data):
+        return (struct.pack(">I", len(data)) + kind + data
+                + struct.pack(">I", zlib.crc32(kind + data)))
+
+    header = struct.pack(">IIBBBBB", 64, 48, 8, 2, 0, 0, 0)
+    return (b"\x89PNG\r\n\x1a\n" + chunk(b"IHDR", header)
+            + chunk(b"IDAT", zlib.compress(rows, 9)) + chunk(b"IEND", b""))
+
+
+class BitWriter:
+    def __init__(self):
+        self.bits = ""
+
+    def write(self, value, length):
+        if length:
+            self.bits += format(value, f"0{length}b")
+
+    def done(self):
+        bits = self.bits + "1" * (-len(self.bits) % 8)
+        data = bytes(int(bits[i:i + 8], 2) for i in range(0, len(bits), 8))
+        return data.replace(b"\xff", b"\xff\x00")
+
+
+def jpeg(seed):
+    """A grey baseline JPEG (ITU-T T.81): one value for each 8 x 8 block makes a coarse gradient."""
+    lengths = bytes([0, 2, 3, 1, 1, 1, 1, 1] + [0] * 8)  # categories 0 to 9, of 2 to 8 bits
+    categories = bytes(range(10))
+    codes = {}
+    code = 0
+    index = 0
+    for bits, count in enumerate(lengths, start=1):
+        for _ in range(count):
+            codes[categories[index]] = (code, bits)
+            code += 1
+            index += 1
+        code <<= 1
+
+    def segment(marker, data):
+        return bytes([0xFF, marker]) + struct.pack(">H", len(data) + 2) + data
+
+    writer = BitWriter()
+    last = 0
+    for block in range(8 * 6):
+        level = ((seed * 23 + 12 * (block % 8) + 14 * (block // 8)) % 200) - 100
+        difference = level - last
+        last = level
+        category = abs(difference).bit_length()
+        writer.write(*codes[category])
+        value = difference if difference >= 0 else difference + (1 << category) - 1
+        writer.write(value, category)
+        writer.write(0, 1)  # end of block, the only code of the AC table
+    return (b"\xff\xd8"
+            + segment(0xE0, b"JFIF\0\x01\x01\0\0\x01\0\x01\0\0")
+            + segment(0xDB, b"\0" + bytes([8] * 64))
+            + segment(0xC0, struct.pack(">BHHBBBB", 8, 48, 64, 1, 1, 0x11, 0))
+            + segment(0xC4, b"\x00" + lengths + categories)
+            + segment(0xC4, b"\x10" + bytes([1] + [0] * 15) + b"\0")
+            + segment(0xDA, b"\x01\x01\0\0\x3f\0")
+            + writer.done() + b"\xff\xd9")
+
+
+# Photos
+
+
+def sexagesimal(degrees):
+    minutes = (degrees % 1) * 60
+    return f"{int(degrees)}/1 {int(minutes)}/1 {round(minutes % 1 * 6000)}/100"
+
+
+def metadata(local, zone, place, keywords, hierarchy, person, event):
+    """exiv2's commands for one photo. `zone` says what tells the offset: offset, gps or none."""
+    commands = [
+        f"set Exif.Photo.DateTimeOriginal Ascii {local.strftime('%Y:%m:%d %H:%M:%S')}",
+        "set Exif.Image.Make Ascii Sample",
+    ]
+    if zone == "offset":
+        commands.append("set Exif.Photo.OffsetTimeOriginal Ascii +02:00")
+    if zone == "gps":
+        fix = local - LOCAL_OFFSET - timedelta(seconds=4)
+        commands += [
+            f"set Exif.GPSInfo.GPSDateStamp Ascii {fix.strftime('%Y:%m:%d')}",
+            f"set Exif.GPSInfo.GPSTimeStamp Rational {fix.hour}/1 {fix.minute}/1 {fix.second}/1",
+        ]
+    if place:
+        commands += [
+            "set Exif.GPSInfo.GPSLatitudeRef Ascii N",
+            f"set Exif.GPSInfo.GPSLatitude Rational {sexagesimal(place[0])}",
+            "set Exif.GPSInfo.GPSLongitudeRef Ascii E",
+            f"set Exif.GPSInfo.GPSLongitude Rational {sexagesimal(place[1])}",
+        ]
+    commands += [f"set Xmp.dc.subject XmpBag {word}" for word in keywords]
+    commands += [f"set Xmp.lr.hierarchicalSubject XmpBag {path}" for path in hierarchy]
+    if person:
+        region = "Xmp.mwg-rs.Regions/mwg-rs:RegionList[1]"
+        commands += [
+            "set Xmp.mwg-rs.Regions XmpText type=Struct",
+            "set Xmp.mwg-rs.Regions/mwg-rs:RegionList XmpText type=Bag",
+            f"set {region}/mwg-rs:Name XmpText {person}",
+            f"set {region}/mwg-rs:Type XmpText Face",
+        ]
+    if event:
+        commands.append(f"set Xmp.iptcExt.Event LangAlt {event}")
+    return commands
+
+
+PHOTOS = [
+    # name, local time, zone, place, keywords, hierarchy, person, event
+    ("hike-1.jpg", "2024-06-15 10:12:40", "offset", (47.2090, 15.4662), ["mountain", "hiking"], [],
+     None, None),
+    ("hike-2.jpg", "2024-06-15 10:41:05", "gps", (47.2230, 15.4661), ["Berge", "Natur"], [], None,
+     None),
+    ("hike-3.jpg", "2024-06-15 11:10:30", "offset", (47.2360, 15.4663), ["Gipfel"],
+     ["Freizeit|Wandern"], "Anna Beispiel", None),
+    ("hike-4.jpg", "2024-06-15 11:16:12", "gps", (47.2390, 15.4660), ["mountain", "nature"], [],
+     "Jakob Muster", None),
+    ("hike-5.jpg", "2024-06-15 11:52:00", "none", (47.2240, 15.4662), ["Wald", "Wanderung"], [],
+     None, None),
+    ("hike-6.jpg", "2024-06-15 12:24:48", "offset", (47.2070, 15.4661), ["nature", "hiking"], [],
+     None, None),
+    ("run-baby-1.jpg", "2024-06-12 18:40:10", "offset", (47.0800, 15.4502), ["baby"], [], None,
+     None),
+    ("run-dog.jpg", "2024-06-12 18:52:30", "gps", (47.0850, 15.4501), ["Hund", "pet"], [], None,
+     None),
+    ("run-baby-2.jpg", "2024-06-12 19:05:00", "none", (47.0820, 15.4500), ["baby", "pet"], [],
+     None, None),
+    ("party-1.jpg", "2024-06-14 19:31:00", "offset", HOME, ["birthday"], [], "Anna Beispiel",
+     None),
+    ("party-2.jpg", "2024-06-14 20:02:15", "offset", HOME, ["birthday", "party"], [], None, None),
+    ("party-3.jpg", "2024-06-14 20:40:00", "offset", None, ["birthday"], [], None,
+     "Sommerfest im Hof"),
+    ("party-4.jpg", "2024-06-14 20:58:20", "offset", HOME, ["birthday"], ["Feste|Geburtstag"],
+     None, None),
+    ("party-5.png", "2024-06-14 21:15:30", "offset", HOME, ["birthday", "Feier"], [],
+     "Jakob Muster", None),
+]
+
+
+def make_photos(folder):
+    folder.mkdir(parents=True, exist_ok=True)
+    for seed, (name, local, zone, place, keywords, hierarchy, person, event) in enumerate(PHOTOS):
+        path = folder / name
+        path.write_bytes(png(seed) if name.endswith(".png") else jpeg(seed))
+        commands = metadata(utc(local), zone, place, keywords, hierarchy, person, event)
+        arguments = [part for command in commands for part in ("-M", command)]
+        subprocess.run(["exiv2", *arguments, str(path)], check=True)
+    (folder / "undated.jpg").write_bytes(jpeg(len(PHOTOS)))
+
+
+def main():
+    beside = Path(__file__).resolve().parent.parent / "data" / "sample"
+    folder = Path(sys.argv[1]) if len(sys.argv) > 1 else beside
+    make_tracks(folder / "tracks")
+    make_photos(folder / "photos")
+
+
+if __name__ == "__main__":
+    main()
