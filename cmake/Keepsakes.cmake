@@ -23,6 +23,7 @@ find_package(SQLiteCpp REQUIRED)
 pkg_check_modules(SQLITE REQUIRED IMPORTED_TARGET sqlite3)
 pkg_check_modules(SYSTEMD REQUIRED IMPORTED_TARGET libsystemd)
 pkg_check_modules(PUGIXML REQUIRED IMPORTED_TARGET pugixml)
+pkg_check_modules(TOMLPLUSPLUS REQUIRED IMPORTED_TARGET tomlplusplus)
 
 add_library(keepsakes_options INTERFACE)
 target_compile_features(keepsakes_options INTERFACE cxx_std_23)
