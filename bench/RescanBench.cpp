@@ -21,7 +21,7 @@ namespace {
 
 /// A photo in a few bytes: its number is its time.
 class TinyReader final : public FileReader {
- public:
+  public:
     std::expected<std::optional<FileRecords>, std::string> read(int, int, KSDate) override {
         FileRecords records;
         ++count_;
@@ -36,12 +36,12 @@ class TinyReader final : public FileReader {
         return records;
     }
 
- private:
+  private:
     double count_ = 0;
 };
 
 class SilentReporter final : public ScanReporter {
- public:
+  public:
     void progress(std::uint64_t, std::uint64_t) override {}
     void problem(const std::string& line) override { fmt::print("problem: {}\n", line); }
     void report(const ScanSummary& done) override { summary = done; }
@@ -85,9 +85,9 @@ int main() {
     TinyReader reader;
     SilentReporter reporter;
     const auto scan = [&] {
-        const auto error = scanFolders(
-            {.index = index, .tracks = {}, .photos = {root / "Pictures"}, .now = {0}}, reader,
-            **mark, reporter);
+        const auto error =
+            scanFolders({.index = index, .tracks = {}, .photos = {root / "Pictures"}, .now = {0}},
+                        reader, **mark, reporter);
         if (error) fmt::print("scan: {}\n", error->description());
     };
     const long before = peakKilobytes();
@@ -95,7 +95,7 @@ int main() {
     fmt::print("first scan of {} tiny files: {:.0f} ms, {} bytes of memory a file\n",
                reporter.summary.read, first, (peakKilobytes() - before) * 1024 / kFiles);
     const double rescan = best(15, scan);
-    struct stat info{};
+    struct stat info {};
     const double stats = best(15, [&] {
         for (const auto& path : paths) (void)!::stat(path.c_str(), &info);
     });

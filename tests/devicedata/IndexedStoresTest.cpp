@@ -22,7 +22,7 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 
 class IndexedStores : public testing::Test {
- protected:
+  protected:
     void makeIndex(const std::string& rows) {
         SQLite::Database index(path_.string(), SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE);
         index.exec("PRAGMA journal_mode = WAL");
@@ -85,8 +85,9 @@ TEST_F(IndexedStores, WorkoutsAreThoseThatEndInTheWindowEachOnce) {
         "(5, 10, 99, 24), (6, 150, 201, 24)");
     const auto samples = workouts(100, 200);
     ASSERT_TRUE(samples);
-    EXPECT_THAT(*samples, ElementsAre(WorkoutSample{{90}, {200}, 24}, WorkoutSample{{50}, {100}, 24},
-                                      WorkoutSample{{50}, {100}, 37}));
+    EXPECT_THAT(*samples,
+                ElementsAre(WorkoutSample{{90}, {200}, 24}, WorkoutSample{{50}, {100}, 24},
+                            WorkoutSample{{50}, {100}, 37}));
 }
 
 TEST_F(IndexedStores, KeepsakesAreThoseThatOverlapTheInterval) {
@@ -103,14 +104,12 @@ TEST_F(IndexedStores, KeepsakesAreThoseThatOverlapTheInterval) {
     const auto summary = photos.summary(wanted);
     EXPECT_THAT(keepsakes(summary), ElementsAre("late", "over"));
     EXPECT_EQ(valueForKey(*summary, kKSKeyGraphCreationDate), KSValue(KSDate{777.5}));
-    EXPECT_EQ(
-        valueForKey(*summary, kKSKeyEvents).asArray()->front(),
-        KSValue(KSDictionary{
-            {"localIdentifier", "late"},
-            {"inferences", KSArray{"beach"}},
-            {"photoCount", 2},
-            {"eventUniversalDateInterval",
-             KSDictionary{{"start", KSDate{300}}, {"end", KSDate{400}}}}}));
+    EXPECT_EQ(valueForKey(*summary, kKSKeyEvents).asArray()->front(),
+              KSValue(KSDictionary{{"localIdentifier", "late"},
+                                   {"inferences", KSArray{"beach"}},
+                                   {"photoCount", 2},
+                                   {"eventUniversalDateInterval",
+                                    KSDictionary{{"start", KSDate{300}}, {"end", KSDate{400}}}}}));
     EXPECT_FALSE(photos.summary(std::vector<std::string>(PhotoAnalysis::kMostIdentifiers + 1)));
 }
 

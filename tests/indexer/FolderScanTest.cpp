@@ -25,7 +25,7 @@ using testing::IsEmpty;
 using testing::UnorderedElementsAre;
 
 class RecordingReporter final : public ScanReporter {
- public:
+  public:
     void progress(std::uint64_t, std::uint64_t) override {}
     void problem(const std::string& line) override { problems.push_back(line); }
     void report(const ScanSummary& done) override { summary = done; }
@@ -43,7 +43,7 @@ struct Occasion {
 };
 
 class FolderScan : public testing::Test {
- protected:
+  protected:
     void SetUp() override {
         fs::create_directories(tracks_);
         fs::create_directories(photos_);
@@ -141,9 +141,8 @@ TEST_F(FolderScan, DeletedRecordsAreNotFoundInTheFilesBytes) {
 
 TEST_F(FolderScan, PassesOverWhatIsNoFileOfTheOwners) {
     folder_.write("Tracks/good.gpx", "workout 100 200 24");
-    for (const char* name :
-         {"x.gpx.part", ".trashed-17-x.gpx", ".stversions/x.gpx", "x.gpx.crdownload",
-          ".syncthing.x.gpx.tmp", ".thumbnails/x.gpx"}) {
+    for (const char* name : {"x.gpx.part", ".trashed-17-x.gpx", ".stversions/x.gpx",
+                             "x.gpx.crdownload", ".syncthing.x.gpx.tmp", ".thumbnails/x.gpx"}) {
         folder_.write(std::string("Tracks/") + name, "workout 1 2 24");
     }
     ASSERT_EQ(::mkfifo((tracks_ / "pipe.gpx").c_str(), 0600), 0);
@@ -156,8 +155,8 @@ TEST_F(FolderScan, PassesOverWhatIsNoFileOfTheOwners) {
     const auto reporter = scan();
     EXPECT_THAT(workoutStarts(), ElementsAre(100));
     EXPECT_EQ(reporter.summary->totals.files, 2u);
-    EXPECT_THAT(reporter.problems,
-                ElementsAre(HasSubstr("caf\\xe9\\x0a.gpx: with \\x01 bytes"), HasSubstr("too deep")));
+    EXPECT_THAT(reporter.problems, ElementsAre(HasSubstr("caf\\xe9\\x0a.gpx: with \\x01 bytes"),
+                                               HasSubstr("too deep")));
 }
 
 TEST_F(FolderScan, AMovedFileKeepsItsRecordsUnread) {
@@ -212,8 +211,7 @@ TEST_F(FolderScan, BuildsADamagedOrForeignIndexAnew) {
     const auto size = fs::file_size(index_);
     const auto spoil = {
         std::function([this] { folder_.write("deviceData.sqlite", std::string(9000, 'x')); }),
-        std::function([this, size] { fs::resize_file(index_, size / 2); }),
-        std::function([this] {
+        std::function([this, size] { fs::resize_file(index_, size / 2); }), std::function([this] {
             SQLite::Database(index_.string(), SQLite::OPEN_READWRITE)
                 .exec("PRAGMA user_version = 7");
         })};

@@ -25,7 +25,7 @@ constexpr bool kIsConfined = true;
 #endif
 
 class IndexerCrash : public testing::Test {
- protected:
+  protected:
     IndexerOptions options(int mostStarts = 16) const {
         return {.program = KEEPSAKES_PLANTED_INDEXER,
                 .index = folder_ / "cache/deviceData.sqlite",

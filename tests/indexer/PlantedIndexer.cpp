@@ -30,7 +30,7 @@ std::string escapes(const std::string& outside) {
 }
 
 class PlantedReader final : public TextReader {
- public:
+  public:
     std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted,
                                                                 KSDate now) override {
         auto records = TextReader::read(fd, wanted, now);

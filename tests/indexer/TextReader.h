@@ -18,7 +18,7 @@ namespace keepsakes {
 ///     broken REASON
 /// A file that begins with anything else is of another kind.
 class TextReader : public FileReader {
- public:
+  public:
     std::expected<std::optional<FileRecords>, std::string> read(int fd, int, KSDate) override {
         std::string content(65536, '\0');
         const auto count = ::pread(fd, content.data(), content.size(), 0);
@@ -29,7 +29,7 @@ class TextReader : public FileReader {
 
     std::vector<std::string> reads;  ///< The content of each file read, in order.
 
- protected:
+  protected:
     static std::expected<std::optional<FileRecords>, std::string> parse(
         const std::string& content) {
         FileRecords records;

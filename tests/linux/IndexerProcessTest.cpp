@@ -25,7 +25,7 @@ constexpr const char* kReport = R"(echo '{"report": {"indexed": 7, "refused": 2}
 
 /// Runs shell scripts in place of the indexer. Time is virtual, the children are real.
 class IndexerProcessTest : public testing::Test {
- protected:
+  protected:
     void SetUp() override { ASSERT_EQ(::mkfifo((folder_ / "gate").c_str(), 0600), 0); }
 
     void TearDown() override {
@@ -79,12 +79,10 @@ class IndexerProcessTest : public testing::Test {
 constexpr const char* kProgress = R"(echo '{"progress": {"done": 1, "total": 2}}')";
 
 TEST_F(IndexerProcessTest, HandsOnWhatTheChildSays) {
-    IndexerProcess index(
-        clock_,
-        script(R"(echo 'no json'; head -c 200000 /dev/zero; echo; echo '[]'
+    IndexerProcess index(clock_, script(R"(echo 'no json'; head -c 200000 /dev/zero; echo; echo '[]'
                   echo '{"problem": "old"}'; echo '{"problem": "new"}'
                   echo "$@" > $folder/words; printf '%s' '{"problem": )" +
-               std::string(100000, 'x') + "'; echo '\"}'; " + kReport));
+                                        std::string(100000, 'x') + "'; echo '\"}'; " + kReport));
     const auto report = index.refresh({});
     EXPECT_TRUE(report.complete);
     EXPECT_EQ(report.filesIndexed, 7u);
