@@ -15,7 +15,7 @@ namespace keepsakes {
 
 std::expected<bool, KSError> IndexFile::ask(
     const std::function<void(SQLite::Database&)>& question) const {
-    struct stat info{};
+    struct stat info {};
     if (::stat(path_.c_str(), &info) != 0) {
         if (errno == ENOENT || errno == ENOTDIR) return false;
         return std::unexpected(posixError(errno, "open", path_));

@@ -17,16 +17,15 @@ namespace keepsakes {
 /// a file that appears, is replaced or is deleted between two questions is simply what it is then,
 /// and nothing of it stays in memory. Any thread may ask.
 class IndexFile {
- public:
+  public:
     explicit IndexFile(std::filesystem::path path) : path_(std::move(path)) {}
 
     /// Calls `question` with the open index. False, without calling it, when there is no index
     /// yet. An index that is damaged, of another version, locked for long or not readable is an
     /// error; so is an exception of the database's library that leaves `question`.
-    std::expected<bool, KSError> ask(
-        const std::function<void(SQLite::Database&)>& question) const;
+    std::expected<bool, KSError> ask(const std::function<void(SQLite::Database&)>& question) const;
 
- private:
+  private:
     std::filesystem::path path_;
 };
 

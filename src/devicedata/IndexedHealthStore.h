@@ -17,7 +17,7 @@ struct OwnerFacts {
 /// hold (same start, end and activity) is one workout. Before the first scan there are none. The
 /// handler runs on the store's own queue; its owner's destruction waits for questions under way.
 class IndexedHealthStore final : public HealthStore {
- public:
+  public:
     IndexedHealthStore(std::filesystem::path index, OwnerFacts owner);
 
     void queryWorkouts(KSDateInterval window, std::function<void(Workouts)> handler) override;
@@ -25,7 +25,7 @@ class IndexedHealthStore final : public HealthStore {
     std::expected<std::optional<DateComponents>, KSError> dateOfBirth() const override;
     std::expected<std::optional<int>, KSError> biologicalSex() const override;
 
- private:
+  private:
     Workouts workouts(KSDateInterval window) const;
 
     const IndexFile index_;

@@ -52,18 +52,18 @@ PhotoAnalysis::Summary IndexedPhotoAnalysis::summaryOf(
     const std::string& condition, const std::function<void(SQLite::Statement&)>& bind) const {
     KSArray keepsakes;
     KSDate changed = KSDate::distantPast();
-    const auto answered = index_.ask([&keepsakes, &changed, &condition,
-                                      &bind](SQLite::Database& index) {
-        SQLite::Statement date(index, "SELECT value FROM meta WHERE key = ?");
-        date.bind(1, std::string(kMetaLastChanged));
-        if (date.executeStep()) changed = {date.getColumn(0).getDouble()};
-        SQLite::Statement query(
-            index, fmt::format("SELECT identifier, start, end, photos, content FROM occasions"
-                               " WHERE {} ORDER BY start, identifier",
-                               condition));
-        bind(query);
-        while (query.executeStep()) keepsakes.emplace_back(keepsake(query));
-    });
+    const auto answered =
+        index_.ask([&keepsakes, &changed, &condition, &bind](SQLite::Database& index) {
+            SQLite::Statement date(index, "SELECT value FROM meta WHERE key = ?");
+            date.bind(1, std::string(kMetaLastChanged));
+            if (date.executeStep()) changed = {date.getColumn(0).getDouble()};
+            SQLite::Statement query(
+                index, fmt::format("SELECT identifier, start, end, photos, content FROM occasions"
+                                   " WHERE {} ORDER BY start, identifier",
+                                   condition));
+            bind(query);
+            while (query.executeStep()) keepsakes.emplace_back(keepsake(query));
+        });
     if (!answered) return std::unexpected(answered.error());
     return KSDictionary{{std::string(kKSKeyGraphCreationDate), changed},
                         {std::string(kKSKeyEvents), std::move(keepsakes)}};

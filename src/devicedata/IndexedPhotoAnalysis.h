@@ -14,7 +14,7 @@ namespace keepsakes {
 /// last scan that changed anything. Before the first scan there are no keepsakes, and the date is
 /// the distant past.
 class IndexedPhotoAnalysis final : public PhotoAnalysis {
- public:
+  public:
     explicit IndexedPhotoAnalysis(std::filesystem::path index) : index_(std::move(index)) {}
 
     /// Touching counts as overlapping.
@@ -23,7 +23,7 @@ class IndexedPhotoAnalysis final : public PhotoAnalysis {
     /// In the order of their start. More identifiers than `kMostIdentifiers` are an error.
     Summary summary(std::span<const std::string> identifiers) override;
 
- private:
+  private:
     Summary summaryOf(const std::string& condition,
                       const std::function<void(SQLite::Statement&)>& bind) const;
 

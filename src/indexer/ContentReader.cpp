@@ -16,8 +16,8 @@ std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int f
     std::array<std::byte, kHeadSize> head;
     std::size_t filled = 0;
     while (filled < head.size()) {
-        const auto count = ::pread(fd, head.data() + filled, head.size() - filled,
-                                   static_cast<off_t>(filled));
+        const auto count =
+            ::pread(fd, head.data() + filled, head.size() - filled, static_cast<off_t>(filled));
         if (count < 0 && errno == EINTR) continue;
         if (count < 0) return std::unexpected(std::generic_category().message(errno));
         if (count == 0) break;

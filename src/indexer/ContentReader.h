@@ -7,7 +7,7 @@ namespace keepsakes {
 
 /// The reader of tracks and photos, by their content.
 class ContentReader final : public FileReader {
- public:
+  public:
     std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted,
                                                                 KSDate now) override;
 };

@@ -15,7 +15,7 @@ enum Wanted : int { kWantsTracks = 1, kWantsPhotos = 2 };
 /// Turns an open file into records. It may throw, crash, hang or eat memory: the scan is made for
 /// that.
 class FileReader {
- public:
+  public:
     virtual ~FileReader() = default;
 
     /// The records of a file whose content is of a kind in `wanted` (bits of `Wanted`), nothing

@@ -49,7 +49,7 @@ std::expected<FolderListing, int> listFolder(const std::string& path) {
         ::close(fd);
         return std::unexpected(code);
     }
-    struct stat info{};
+    struct stat info {};
     if (::fstat(fd, &info) != 0) return std::unexpected(errno);
     FolderListing listing;
     listing.identity = {info.st_dev, info.st_ino};

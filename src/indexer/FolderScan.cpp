@@ -37,7 +37,7 @@ double secondsSince(Steady::time_point then) {
 }
 
 class OpenFile {
- public:
+  public:
     explicit OpenFile(const std::string& path)
         // Without O_NONBLOCK, a pipe that took the file's place would be waited for.
         : fd_(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK)),
@@ -52,7 +52,7 @@ class OpenFile {
     int error() const { return error_; }
 
     std::optional<FileStamp> stamp() const {
-        struct stat info{};
+        struct stat info {};
         if (fd_ < 0 || ::fstat(fd_, &info) != 0 || !S_ISREG(info.st_mode)) return std::nullopt;
         return FileStamp{
             .size = info.st_size,
@@ -60,7 +60,7 @@ class OpenFile {
             .inode = static_cast<std::int64_t>(info.st_ino)};
     }
 
- private:
+  private:
     int fd_;
     int error_;
 };
@@ -75,7 +75,8 @@ bool promises(std::string_view name, int wanted) {
     if (dot == std::string_view::npos) return false;
     std::string extension(name.substr(dot));
     for (char& c : extension) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-    return ((wanted & kWantsTracks) != 0 && std::ranges::find(kTracks, extension) != kTracks.end()) ||
+    return ((wanted & kWantsTracks) != 0 &&
+            std::ranges::find(kTracks, extension) != kTracks.end()) ||
            ((wanted & kWantsPhotos) != 0 && std::ranges::find(kPhotos, extension) != kPhotos.end());
 }
 
@@ -94,7 +95,7 @@ struct ReadOutcome {
 };
 
 class Scan {
- public:
+  public:
     Scan(const ScanOptions& options, FileReader& reader, ReadMark& mark, ScanReporter& reporter)
         : options_(options),
           reader_(reader),
@@ -119,7 +120,7 @@ class Scan {
         reportAll();
     }
 
- private:
+  private:
     std::vector<SearchedFolder> searchedFolders() const {
         std::vector<SearchedFolder> folders;
         const auto add = [&folders](const std::filesystem::path& path, int wanted) {
@@ -337,8 +338,7 @@ class Scan {
         auto refused = index_.refusedFiles(kMostProblems);
         std::ranges::reverse(refused);
         for (const auto& file : refused) {
-            reporter_.problem(
-                fmt::format("passed over {}: {}", printable(file.path), file.reason));
+            reporter_.problem(fmt::format("passed over {}: {}", printable(file.path), file.reason));
         }
         for (const auto& problem : changes_.problems) {
             logWarning(problem);

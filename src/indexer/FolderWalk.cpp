@@ -20,7 +20,7 @@ namespace {
 using Identity = std::pair<std::uint64_t, std::uint64_t>;
 
 class Walk {
- public:
+  public:
     Walk(IndexWriter& index, const std::function<void()>& alive)
         : index_(index), alive_(alive), unvisited_(index.folders()) {}
 
@@ -28,7 +28,7 @@ class Walk {
         // A folder before those that lie in it.
         std::ranges::stable_sort(searched, {}, [](const auto& f) { return f.path.size(); });
         for (const auto& root : searched) {
-            struct stat info{};
+            struct stat info {};
             if (::stat(root.path.c_str(), &info) == 0) {
                 wanted_[{info.st_dev, info.st_ino}] |= root.wanted;
             }
@@ -45,7 +45,7 @@ class Walk {
         return std::move(changes_);
     }
 
- private:
+  private:
     struct Pending {
         std::string path;
         int wanted;
@@ -106,8 +106,8 @@ class Walk {
         if (const auto known = unvisited_.find(path); known != unvisited_.end()) {
             const auto id = known->second;
             unvisited_.erase(known);
-            index_.forEachFile(id, [this, &there, &listing, &add, wanted, id](
-                                       std::string&& name, IndexedFile&& file) {
+            index_.forEachFile(id, [this, &there, &listing, &add, wanted, id](std::string&& name,
+                                                                              IndexedFile&& file) {
                 for (; there != listing.files.end() && there->name < name; ++there) {
                     add(*there, nullptr);
                 }

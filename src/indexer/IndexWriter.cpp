@@ -85,8 +85,8 @@ std::unordered_map<std::string, std::int64_t> IndexWriter::folders() {
     return folders;
 }
 
-void IndexWriter::forEachFile(
-    std::int64_t folder, const std::function<void(std::string&&, IndexedFile&&)>& visit) {
+void IndexWriter::forEachFile(std::int64_t folder,
+                              const std::function<void(std::string&&, IndexedFile&&)>& visit) {
     auto& query = statement(
         "SELECT name, id, size, mtime, inode, wanted, state, hash, reason, refusedAt FROM files"
         " WHERE folder = ? ORDER BY name");
@@ -192,8 +192,9 @@ void IndexWriter::removeFile(std::int64_t folder, const std::string& name) {
 
 void IndexWriter::removeEmptyFolders() {
     begin();
-    statement("DELETE FROM folders WHERE NOT EXISTS"
-              " (SELECT 1 FROM files WHERE files.folder = folders.id)")
+    statement(
+        "DELETE FROM folders WHERE NOT EXISTS"
+        " (SELECT 1 FROM files WHERE files.folder = folders.id)")
         .exec();
     newFolders_.clear();
 }
@@ -255,9 +256,9 @@ void IndexWriter::putRecords(std::int64_t file, const FileRecords& records) {
 
 void IndexWriter::removeRecords(std::int64_t file) {
     begin();
-    for (const char* text : {"DELETE FROM workouts WHERE file = ?",
-                             "DELETE FROM zones WHERE file = ?",
-                             "DELETE FROM photos WHERE file = ?"}) {
+    for (const char* text :
+         {"DELETE FROM workouts WHERE file = ?", "DELETE FROM zones WHERE file = ?",
+          "DELETE FROM photos WHERE file = ?"}) {
         auto& remove = statement(text);
         remove.bind(1, file);
         const bool removed = remove.exec() > 0;

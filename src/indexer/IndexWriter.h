@@ -37,7 +37,7 @@ struct RefusedFile {
 /// The one writer of the index. Lives on the scan's thread. Its changes are kept together and
 /// become visible with `commit`. Throws `SQLite::Exception`, which the scan catches.
 class IndexWriter {
- public:
+  public:
     /// Opens or makes the file; one of another version, or that is no database, is deleted first.
     explicit IndexWriter(const std::filesystem::path& path);
 
@@ -91,7 +91,7 @@ class IndexWriter {
 
     SQLite::Database& database() { return database_; }
 
- private:
+  private:
     void begin();
     double meta(std::string_view key, double otherwise);
 

@@ -7,12 +7,11 @@
 
 #include <charconv>
 #include <chrono>
-#include <clocale>
-#include <cstdlib>
 #include <expected>
 #include <span>
 #include <string_view>
 
+#include "config/Configuration.h"
 #include "core/Calendar.h"
 #include "core/Files.h"
 #include "core/Log.h"
@@ -29,9 +28,11 @@ constexpr int kUsage = 2;
 constexpr int kBusy = 3;
 
 constexpr const char* kHelp =
-    "usage: keepsakes-indexer [--index FILE] [--tracks FOLDER...] [--photos FOLDER...]\n"
-    "                         [--now SECONDS] [--seconds-per-file N] [--json | --human]\n"
+    "usage: keepsakes-indexer [--config FILE] [--index FILE] [--tracks FOLDER...]\n"
+    "                         [--photos FOLDER...] [--now SECONDS] [--seconds-per-file N]\n"
+    "                         [--json | --human]\n"
     "Scans the folders once and brings the index up to date.\n"
+    "  --config   whose folders to scan when none are given; otherwise the daemon's\n"
     "  --index    the index; otherwise the daemon's, in the user's cache folder\n"
     "  --now      the time to take for now, in seconds since 2001-01-01 UTC\n"
     "  --json     one JSON object a line on standard output\n"
@@ -39,27 +40,34 @@ constexpr const char* kHelp =
 
 struct Arguments {
     ScanOptions scan;
+    std::filesystem::path config;
     unsigned secondsPerFile = ReadMark::kSecondsPerFile;
     bool json = ::isatty(STDOUT_FILENO) != 1;
     bool help = false;
 };
 
 KSDate systemNow() {
-    return KSDate::fromUnix(std::chrono::duration<double>(
-                                std::chrono::system_clock::now().time_since_epoch())
-                                .count());
+    return KSDate::fromUnix(
+        std::chrono::duration<double>(std::chrono::system_clock::now().time_since_epoch()).count());
 }
 
-std::filesystem::path defaultIndex() {
-    const char* cache = std::getenv("XDG_CACHE_HOME");
-    const char* home = std::getenv("HOME");
-    std::filesystem::path folder;
-    if (cache && *cache == '/') {
-        folder = cache;
-    } else if (home) {
-        folder = std::filesystem::path(home) / ".cache";
-    }
-    return folder.empty() ? folder : folder / "com.brindle.keepsakesd" / "deviceData.sqlite";
+/// Completes what the arguments leave open: the folders from the configuration, the index from the
+/// user's cache folder. Why that cannot be done, or nothing.
+std::optional<std::string> complete(Arguments& arguments) {
+    auto& scan = arguments.scan;
+    const bool needsFolders = scan.tracks.empty() && scan.photos.empty();
+    if (!needsFolders && !scan.index.empty()) return std::nullopt;
+    const auto standard = StandardFolders::find();
+    if (!standard) return standard.error().description();
+    if (scan.index.empty()) scan.index = standard->cache / "deviceData.sqlite";
+    if (!needsFolders) return std::nullopt;
+    const auto configuration = arguments.config.empty()
+                                   ? loadConfigurationIfAny(standard->configurationFile())
+                                   : loadConfiguration(arguments.config);
+    if (!configuration) return configuration.error().description();
+    scan.tracks = configuration->deviceData.tracks;
+    scan.photos = configuration->deviceData.photos;
+    return std::nullopt;
 }
 
 template <class T>
@@ -84,6 +92,10 @@ std::optional<std::string> parse(std::span<char*> words, Arguments& arguments) {
             const auto path = value();
             if (!path) return "--index needs a file";
             arguments.scan.index = *path;
+        } else if (option == "--config") {
+            const auto path = value();
+            if (!path) return "--config needs a file";
+            arguments.config = *path;
         } else if (option == "--now") {
             const auto text = value();
             if (!text || !parseNumber(*text, arguments.scan.now.seconds)) {
@@ -103,8 +115,6 @@ std::optional<std::string> parse(std::span<char*> words, Arguments& arguments) {
             return fmt::format("what is {}?", option);
         }
     }
-    if (arguments.scan.index.empty()) arguments.scan.index = defaultIndex();
-    if (arguments.scan.index.empty()) return "no --index, and no home folder to look in";
     return std::nullopt;
 }
 
@@ -149,6 +159,10 @@ int runIndexer(int argc, char** argv, FileReader& reader) {
     if (arguments.help) {
         fmt::print("{}", kHelp);
         return 0;
+    }
+    if (const auto error = complete(arguments)) {
+        fmt::print(stderr, "keepsakes-indexer: {}\n", *error);
+        return kFailed;
     }
     return scan(arguments, reader);
 }

@@ -26,8 +26,8 @@ double distance(const GeoPoint& a, const GeoPoint& b) {
     constexpr double kRadians = std::numbers::pi / 180;
     const double lat = std::sin((b.latitude - a.latitude) * kRadians / 2);
     const double lon = std::sin((b.longitude - a.longitude) * kRadians / 2);
-    const double h = lat * lat + std::cos(a.latitude * kRadians) *
-                                     std::cos(b.latitude * kRadians) * lon * lon;
+    const double h =
+        lat * lat + std::cos(a.latitude * kRadians) * std::cos(b.latitude * kRadians) * lon * lon;
     return 2 * kEarthRadius * std::asin(std::min(1.0, std::sqrt(h)));
 }
 
@@ -170,10 +170,9 @@ KSDictionary occasionContent(std::span<const OccasionWords> photos) {
     }
     KSArray personDictionaries;
     for (const auto& name : byFrequency(persons)) {
-        personDictionaries.emplace_back(
-            KSDictionary{{std::string(kKSKeyPersonLocalIdentifier),
-                          identifierOf("person\n" + name).string()},
-                         {std::string(kKSKeyPersonName), name}});
+        personDictionaries.emplace_back(KSDictionary{
+            {std::string(kKSKeyPersonLocalIdentifier), identifierOf("person\n" + name).string()},
+            {std::string(kKSKeyPersonName), name}});
     }
     KSArray eventDictionaries;
     for (const auto& [name, venue, performers] : byFrequency(events)) {

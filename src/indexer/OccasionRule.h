@@ -51,14 +51,14 @@ std::vector<std::optional<std::int64_t>> continuedOccasions(
 
 /// Seconds east of UTC by the tracks recorded at a time.
 class TrackZones {
- public:
+  public:
     explicit TrackZones(std::vector<ZoneSpan> spans);
 
     /// The offset of the shortest span during which clocks there showed `localTime` (written as
     /// though it were UTC).
     std::optional<int> offsetAt(KSDate localTime) const;
 
- private:
+  private:
     // By the local time of their start; `latestEnd_` is the latest local end of a span and all
     // before it.
     std::vector<ZoneSpan> spans_;

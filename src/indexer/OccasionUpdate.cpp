@@ -37,15 +37,16 @@ TrackZones loadZones(SQLite::Database& database) {
     std::vector<ZoneSpan> spans;
     SQLite::Statement query(database, "SELECT start, end, offset FROM zones");
     while (query.executeStep()) {
-        spans.push_back({.span = {{query.getColumn(0).getDouble()}, {query.getColumn(1).getDouble()}},
-                         .offsetSeconds = query.getColumn(2).getInt()});
+        spans.push_back(
+            {.span = {{query.getColumn(0).getDouble()}, {query.getColumn(1).getDouble()}},
+             .offsetSeconds = query.getColumn(2).getInt()});
     }
     return TrackZones(std::move(spans));
 }
 
 /// The former occasions and the new ones, and all that is written of the difference.
 class Update {
- public:
+  public:
     explicit Update(SQLite::Database& database) : database_(database) {}
 
     void run() {
@@ -63,7 +64,7 @@ class Update {
         }
     }
 
- private:
+  private:
     void loadPhotos() {
         const auto zones = loadZones(database_);
         SQLite::Statement query(database_,
@@ -90,8 +91,8 @@ class Update {
     }
 
     void loadOccasions() {
-        SQLite::Statement query(database_,
-                                "SELECT id, identifier, start, end, photos, content FROM occasions");
+        SQLite::Statement query(
+            database_, "SELECT id, identifier, start, end, photos, content FROM occasions");
         while (query.executeStep()) {
             StoredOccasion occasion{.identifier = query.getColumn(1).getString(),
                                     .start = query.getColumn(2).getDouble(),
@@ -146,8 +147,8 @@ class Update {
         for (const auto member : members) {
             const auto& photo = photos_[member];
             const auto place = photo.position.value_or(GeoPoint{.latitude = 1000, .longitude = 0});
-            auto& words = moments[{std::floor(photo.taken.seconds), place.latitude,
-                                   place.longitude}];
+            auto& words =
+                moments[{std::floor(photo.taken.seconds), place.latitude, place.longitude}];
             if (!rows_[member].words.empty()) merge(words, parseWords(rows_[member].words));
         }
         std::vector<OccasionWords> said;
@@ -185,8 +186,8 @@ class Update {
         statement.exec();
     }
 
-    /// From the content of the first photo's file; copies of one file may have begun occasions that
-    /// were then parted, so the first free one is taken.
+    /// From the content of the first photo's file. Copies of one file may begin occasions that were
+    /// parted since: where it is taken, the file's number in the index makes another.
     std::string newIdentifier(std::uint32_t first) {
         hash_.reset();
         hash_.bind(1, rows_[first].file);
@@ -194,7 +195,9 @@ class Update {
         for (int attempt = 0;; ++attempt) {
             auto identifier = identifierOf("occasion\n" + hash + "\n" +
                                            std::to_string(rows_[first].number) + "\n" +
-                                           std::to_string(attempt))
+                                           (attempt == 0 ? std::string()
+                                                         : std::to_string(rows_[first].file) +
+                                                               "\n" + std::to_string(attempt)))
                                   .string();
             if (!identifiers_.contains(identifier)) return identifier;
         }

@@ -87,7 +87,7 @@ ReadMark::ReadMark(int fd, unsigned secondsPerFile)
     text.resize(count > 0 ? static_cast<std::size_t>(count) : 0);
     leftBehind_ = parseMark(text, bootId_);
     markDescriptor = fd_;
-    struct sigaction action{};
+    struct sigaction action {};
     action.sa_handler = stopInOrder;
     ::sigaction(SIGTERM, &action, nullptr);
     ::sigaction(SIGINT, &action, nullptr);
@@ -102,8 +102,8 @@ ReadMark::~ReadMark() {
 }
 
 void ReadMark::begin(const std::string& path, const FileStamp& stamp) {
-    const auto text = fmt::format("c\n{}\n{}\n{}\n{}\n{}", bootId_, stamp.size, stamp.mtime,
-                                  stamp.inode, path);
+    const auto text =
+        fmt::format("c\n{}\n{}\n{}\n{}\n{}", bootId_, stamp.size, stamp.mtime, stamp.inode, path);
     (void)!::pwrite(fd_, text.data(), text.size(), 0);
     (void)!::ftruncate(fd_, static_cast<off_t>(text.size()));
     ::alarm(secondsPerFile_);

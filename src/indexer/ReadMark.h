@@ -31,7 +31,7 @@ struct ReadMarkEntry {
 /// file takes too long. One for the process, on its main thread. SIGTERM in between ends the
 /// process in order (status `kStoppedStatus`) and takes the mark away, for the file is innocent.
 class ReadMark {
- public:
+  public:
     static constexpr int kStoppedStatus = 4;
     static constexpr unsigned kSecondsPerFile = 30;
 
@@ -49,7 +49,7 @@ class ReadMark {
     void begin(const std::string& path, const FileStamp& stamp);
     void end();
 
- private:
+  private:
     ReadMark(int fd, unsigned secondsPerFile);
 
     int fd_;

@@ -49,7 +49,7 @@ constexpr std::uint64_t kEverything = (LANDLOCK_ACCESS_FS_MAKE_SYM << 1) - 1;
 void allow(int ruleset, const std::filesystem::path& path, std::uint64_t access) {
     const int fd = ::open(path.c_str(), O_PATH | O_CLOEXEC);
     if (fd < 0) return;  // What is not there need not be allowed.
-    struct stat info{};
+    struct stat info {};
     if (::fstat(fd, &info) == 0 && !S_ISDIR(info.st_mode)) {
         access &= ~std::uint64_t{LANDLOCK_ACCESS_FS_READ_DIR};
     }
@@ -63,8 +63,7 @@ void allow(int ruleset, const std::filesystem::path& path, std::uint64_t access)
 void confineFiles(const std::vector<std::filesystem::path>& readable,
                   const std::vector<std::filesystem::path>& writable) {
     const landlock_ruleset_attr attributes{.handled_access_fs = kEverything};
-    const auto made =
-        ::syscall(SYS_landlock_create_ruleset, &attributes, sizeof(attributes), 0);
+    const auto made = ::syscall(SYS_landlock_create_ruleset, &attributes, sizeof(attributes), 0);
     if (made < 0) {
         logInfo(fmt::format("the indexer runs without landlock: {}", textOf(errno)));
         return;
@@ -87,28 +86,97 @@ void confineCalls() {
     // What is not named fails with EPERM rather than ending the process: a library that merely
     // asks for more than it needs then goes on.
     static constexpr auto kAllowed = std::to_array<int>({
-        SCMP_SYS(read), SCMP_SYS(pread64), SCMP_SYS(readv), SCMP_SYS(preadv), SCMP_SYS(write),
-        SCMP_SYS(pwrite64), SCMP_SYS(writev), SCMP_SYS(pwritev), SCMP_SYS(open), SCMP_SYS(openat),
-        SCMP_SYS(close), SCMP_SYS(lseek), SCMP_SYS(_llseek), SCMP_SYS(fstat), SCMP_SYS(fstat64),
-        SCMP_SYS(stat), SCMP_SYS(stat64), SCMP_SYS(lstat), SCMP_SYS(lstat64),
-        SCMP_SYS(newfstatat), SCMP_SYS(fstatat64), SCMP_SYS(statx), SCMP_SYS(statfs),
-        SCMP_SYS(fstatfs), SCMP_SYS(access), SCMP_SYS(faccessat), SCMP_SYS(faccessat2),
-        SCMP_SYS(getdents), SCMP_SYS(getdents64), SCMP_SYS(readlink), SCMP_SYS(readlinkat),
-        SCMP_SYS(getcwd), SCMP_SYS(fcntl), SCMP_SYS(fcntl64), SCMP_SYS(flock), SCMP_SYS(fsync),
-        SCMP_SYS(fdatasync), SCMP_SYS(ftruncate), SCMP_SYS(ftruncate64), SCMP_SYS(fallocate),
-        SCMP_SYS(fadvise64), SCMP_SYS(unlink), SCMP_SYS(unlinkat), SCMP_SYS(rename),
-        SCMP_SYS(renameat), SCMP_SYS(fchmod), SCMP_SYS(fchown), SCMP_SYS(umask), SCMP_SYS(dup),
-        SCMP_SYS(ioctl), SCMP_SYS(poll), SCMP_SYS(ppoll), SCMP_SYS(mmap), SCMP_SYS(mmap2),
-        SCMP_SYS(munmap), SCMP_SYS(mremap), SCMP_SYS(mprotect), SCMP_SYS(madvise), SCMP_SYS(brk),
-        SCMP_SYS(msync), SCMP_SYS(futex), SCMP_SYS(sched_yield), SCMP_SYS(sched_getaffinity),
-        SCMP_SYS(clock_gettime), SCMP_SYS(clock_gettime64), SCMP_SYS(clock_getres),
-        SCMP_SYS(clock_nanosleep), SCMP_SYS(nanosleep), SCMP_SYS(gettimeofday), SCMP_SYS(time),
-        SCMP_SYS(alarm), SCMP_SYS(setitimer), SCMP_SYS(rt_sigaction), SCMP_SYS(rt_sigprocmask),
-        SCMP_SYS(rt_sigreturn), SCMP_SYS(sigreturn), SCMP_SYS(sigaltstack),
-        SCMP_SYS(restart_syscall), SCMP_SYS(getpid), SCMP_SYS(gettid), SCMP_SYS(getuid),
-        SCMP_SYS(geteuid), SCMP_SYS(getgid), SCMP_SYS(getegid), SCMP_SYS(getrandom),
-        SCMP_SYS(sysinfo), SCMP_SYS(uname), SCMP_SYS(getrlimit), SCMP_SYS(getrusage),
-        SCMP_SYS(exit), SCMP_SYS(exit_group),
+        SCMP_SYS(read),
+        SCMP_SYS(pread64),
+        SCMP_SYS(readv),
+        SCMP_SYS(preadv),
+        SCMP_SYS(write),
+        SCMP_SYS(pwrite64),
+        SCMP_SYS(writev),
+        SCMP_SYS(pwritev),
+        SCMP_SYS(open),
+        SCMP_SYS(openat),
+        SCMP_SYS(close),
+        SCMP_SYS(lseek),
+        SCMP_SYS(_llseek),
+        SCMP_SYS(fstat),
+        SCMP_SYS(fstat64),
+        SCMP_SYS(stat),
+        SCMP_SYS(stat64),
+        SCMP_SYS(lstat),
+        SCMP_SYS(lstat64),
+        SCMP_SYS(newfstatat),
+        SCMP_SYS(fstatat64),
+        SCMP_SYS(statx),
+        SCMP_SYS(statfs),
+        SCMP_SYS(fstatfs),
+        SCMP_SYS(access),
+        SCMP_SYS(faccessat),
+        SCMP_SYS(faccessat2),
+        SCMP_SYS(getdents),
+        SCMP_SYS(getdents64),
+        SCMP_SYS(readlink),
+        SCMP_SYS(readlinkat),
+        SCMP_SYS(getcwd),
+        SCMP_SYS(fcntl),
+        SCMP_SYS(fcntl64),
+        SCMP_SYS(flock),
+        SCMP_SYS(fsync),
+        SCMP_SYS(fdatasync),
+        SCMP_SYS(ftruncate),
+        SCMP_SYS(ftruncate64),
+        SCMP_SYS(fallocate),
+        SCMP_SYS(fadvise64),
+        SCMP_SYS(unlink),
+        SCMP_SYS(unlinkat),
+        SCMP_SYS(rename),
+        SCMP_SYS(renameat),
+        SCMP_SYS(fchmod),
+        SCMP_SYS(fchown),
+        SCMP_SYS(umask),
+        SCMP_SYS(dup),
+        SCMP_SYS(ioctl),
+        SCMP_SYS(poll),
+        SCMP_SYS(ppoll),
+        SCMP_SYS(mmap),
+        SCMP_SYS(mmap2),
+        SCMP_SYS(munmap),
+        SCMP_SYS(mremap),
+        SCMP_SYS(mprotect),
+        SCMP_SYS(madvise),
+        SCMP_SYS(brk),
+        SCMP_SYS(msync),
+        SCMP_SYS(futex),
+        SCMP_SYS(sched_yield),
+        SCMP_SYS(sched_getaffinity),
+        SCMP_SYS(clock_gettime),
+        SCMP_SYS(clock_gettime64),
+        SCMP_SYS(clock_getres),
+        SCMP_SYS(clock_nanosleep),
+        SCMP_SYS(nanosleep),
+        SCMP_SYS(gettimeofday),
+        SCMP_SYS(time),
+        SCMP_SYS(alarm),
+        SCMP_SYS(setitimer),
+        SCMP_SYS(rt_sigaction),
+        SCMP_SYS(rt_sigprocmask),
+        SCMP_SYS(rt_sigreturn),
+        SCMP_SYS(sigreturn),
+        SCMP_SYS(sigaltstack),
+        SCMP_SYS(restart_syscall),
+        SCMP_SYS(getpid),
+        SCMP_SYS(gettid),
+        SCMP_SYS(getuid),
+        SCMP_SYS(geteuid),
+        SCMP_SYS(getgid),
+        SCMP_SYS(getegid),
+        SCMP_SYS(getrandom),
+        SCMP_SYS(sysinfo),
+        SCMP_SYS(uname),
+        SCMP_SYS(getrlimit),
+        SCMP_SYS(getrusage),
+        SCMP_SYS(exit),
+        SCMP_SYS(exit_group),
     });
     scmp_filter_ctx filter = seccomp_init(SCMP_ACT_ERRNO(EPERM));
     if (!filter) {
@@ -122,8 +190,7 @@ void confineCalls() {
     const auto self = static_cast<scmp_datum_t>(::getpid());
     for (const int call : {SCMP_SYS(kill), SCMP_SYS(tgkill)}) {
         if (failed == 0) {
-            failed = seccomp_rule_add(filter, SCMP_ACT_ALLOW, call, 1,
-                                      SCMP_A0(SCMP_CMP_EQ, self));
+            failed = seccomp_rule_add(filter, SCMP_ACT_ALLOW, call, 1, SCMP_A0(SCMP_CMP_EQ, self));
         }
     }
     // Asking for limits, not setting them.

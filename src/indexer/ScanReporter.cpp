@@ -13,7 +13,7 @@ namespace keepsakes {
 namespace {
 
 class JsonReporter final : public ScanReporter {
- public:
+  public:
     void progress(std::uint64_t done, std::uint64_t total) override {
         write({{"progress", KSDictionary{{"done", done}, {"total", total}}}});
     }
@@ -33,7 +33,7 @@ class JsonReporter final : public ScanReporter {
                                        {"newlyRefused", std::move(reasons)}}}});
     }
 
- private:
+  private:
     static void write(KSDictionary object) {
         if (const auto text = jsonText(KSValue(std::move(object)))) {
             std::fputs((*text + "\n").c_str(), stdout);
@@ -43,7 +43,7 @@ class JsonReporter final : public ScanReporter {
 };
 
 class HumanReporter final : public ScanReporter {
- public:
+  public:
     void progress(std::uint64_t done, std::uint64_t total) override {
         if (!isTerminal_) return;
         fmt::print("\r{} of {} files read", done, total);
@@ -63,7 +63,7 @@ class HumanReporter final : public ScanReporter {
                    summary.read, summary.renamed, summary.removed);
     }
 
- private:
+  private:
     void endProgress() {
         if (std::exchange(onProgressLine_, false)) fmt::print("\n");
     }
@@ -76,12 +76,18 @@ class HumanReporter final : public ScanReporter {
 
 const char* nameOf(RefusalReason reason) {
     switch (reason) {
-        case RefusalReason::unreadable: return "unreadable";
-        case RefusalReason::damaged: return "damaged";
-        case RefusalReason::wrongContent: return "wrongContent";
-        case RefusalReason::outOfMemory: return "outOfMemory";
-        case RefusalReason::endedIndexer: return "endedIndexer";
-        case RefusalReason::outOfTime: return "outOfTime";
+        case RefusalReason::unreadable:
+            return "unreadable";
+        case RefusalReason::damaged:
+            return "damaged";
+        case RefusalReason::wrongContent:
+            return "wrongContent";
+        case RefusalReason::outOfMemory:
+            return "outOfMemory";
+        case RefusalReason::endedIndexer:
+            return "endedIndexer";
+        case RefusalReason::outOfTime:
+            return "outOfTime";
     }
     return "unknown";
 }

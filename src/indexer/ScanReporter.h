@@ -12,7 +12,14 @@
 namespace keepsakes {
 
 /// Why a file has no records though its folder was searched for them.
-enum class RefusalReason { unreadable, damaged, wrongContent, outOfMemory, endedIndexer, outOfTime };
+enum class RefusalReason {
+    unreadable,
+    damaged,
+    wrongContent,
+    outOfMemory,
+    endedIndexer,
+    outOfTime
+};
 
 const char* nameOf(RefusalReason reason);
 
@@ -28,7 +35,7 @@ struct ScanSummary {
 
 /// Tells what a scan does, on the scan's thread.
 class ScanReporter {
- public:
+  public:
     virtual ~ScanReporter() = default;
     /// `total` is 0 while it is not known.
     virtual void progress(std::uint64_t done, std::uint64_t total) = 0;

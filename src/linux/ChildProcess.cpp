@@ -23,15 +23,15 @@ namespace {
 
 /// posix_spawn's two attribute objects, released together.
 class SpawnSetup {
- public:
+  public:
     explicit SpawnSetup(int output) {
         ::posix_spawn_file_actions_init(&actions_);
         ::posix_spawn_file_actions_addopen(&actions_, STDIN_FILENO, "/dev/null", O_RDONLY, 0);
         ::posix_spawn_file_actions_adddup2(&actions_, output, STDOUT_FILENO);
         ::posix_spawn_file_actions_addclosefrom_np(&actions_, STDERR_FILENO + 1);
         ::posix_spawnattr_init(&attributes_);
-        ::posix_spawnattr_setflags(&attributes_, POSIX_SPAWN_SETPGROUP | POSIX_SPAWN_SETSIGDEF |
-                                                     POSIX_SPAWN_SETSIGMASK);
+        ::posix_spawnattr_setflags(
+            &attributes_, POSIX_SPAWN_SETPGROUP | POSIX_SPAWN_SETSIGDEF | POSIX_SPAWN_SETSIGMASK);
         // The daemon blocks and ignores signals that the child shall die of, a broken pipe's first.
         sigset_t signals;
         ::sigemptyset(&signals);
@@ -49,7 +49,7 @@ class SpawnSetup {
     const posix_spawn_file_actions_t* actions() const { return &actions_; }
     const posix_spawnattr_t* attributes() const { return &attributes_; }
 
- private:
+  private:
     posix_spawn_file_actions_t actions_{};
     posix_spawnattr_t attributes_{};
 };
@@ -107,9 +107,10 @@ ChildEnd ChildProcess::run(const std::function<void(std::string_view)>& line) {
     bool isOpen = true;
     for (;;) {
         const int limit = deliverSignal();
-        std::array<pollfd, 3> watched{{{.fd = wake_, .events = POLLIN, .revents = 0},
-                                       {.fd = isOpen ? output_ : -1, .events = POLLIN, .revents = 0},
-                                       {.fd = pidDescriptor_, .events = POLLIN, .revents = 0}}};
+        std::array<pollfd, 3> watched{
+            {{.fd = wake_, .events = POLLIN, .revents = 0},
+             {.fd = isOpen ? output_ : -1, .events = POLLIN, .revents = 0},
+             {.fd = pidDescriptor_, .events = POLLIN, .revents = 0}}};
         const int ready = ::poll(watched.data(), watched.size(), limit);
         if (ready < 0 && errno == EINTR) continue;
         if (ready == 0) {

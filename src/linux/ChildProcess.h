@@ -29,7 +29,7 @@ struct ChildEnd {
 /// process' standard error, no other descriptor, and a process group of its own. One thread starts
 /// it and supervises it with `run`; any thread may call `end`.
 class ChildProcess {
- public:
+  public:
     /// Longer lines of output are dropped.
     static constexpr std::size_t kLongestLine = std::size_t{64} * 1024;
     /// After `end(SIGTERM)` the child has so many milliseconds before it is killed.
@@ -48,7 +48,7 @@ class ChildProcess {
     /// Sends the signal to the child and what it started; SIGTERM is followed by SIGKILL.
     void end(int signal);
 
- private:
+  private:
     ChildProcess(pid_t pid, int output, int wake);
 
     bool readOutput(const std::function<void(std::string_view)>& line);

@@ -162,10 +162,11 @@ IndexerProcess::Outcome IndexerProcess::runChild(ChildReport& report) {
         child_ = child;
     }
     const auto watchSilence = [this, &report, &child] {
-        report.silence = clock_.after(timers_, options_.silenceLimit, [weak = std::weak_ptr(child)] {
-            logWarning("the indexer hangs and is killed");
-            if (const auto hung = weak.lock()) hung->end(SIGKILL);
-        });
+        report.silence =
+            clock_.after(timers_, options_.silenceLimit, [weak = std::weak_ptr(child)] {
+                logWarning("the indexer hangs and is killed");
+                if (const auto hung = weak.lock()) hung->end(SIGKILL);
+            });
     };
     watchSilence();
     const auto end = child->run([this, &report, &watchSilence](std::string_view line) {
@@ -232,9 +233,9 @@ IndexerProcess::Outcome IndexerProcess::judge(const ChildEnd& end, ChildReport& 
 }
 
 std::vector<std::string> IndexerProcess::arguments() const {
-    std::vector<std::string> words{options_.program.string(), "--json", "--index",
-                                   options_.index.string(), "--now",
-                                   fmt::format("{}", clock_.now().seconds)};
+    std::vector<std::string> words{
+        options_.program.string(), "--json", "--index",
+        options_.index.string(),   "--now",  fmt::format("{}", clock_.now().seconds)};
     const auto add = [&words](const char* option, const std::vector<std::filesystem::path>& paths) {
         if (paths.empty()) return;
         words.emplace_back(option);

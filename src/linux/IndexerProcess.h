@@ -36,7 +36,7 @@ struct IndexerOptions {
 /// thread of its own supervises the child; its limits are timers on the clock. Destruction ends a
 /// scan that runs, within twice `ChildProcess::kGraceMilliseconds`. `clock` outlives it.
 class IndexerProcess final : public DeviceDataIndex {
- public:
+  public:
     static constexpr std::size_t kMostProblems = 50;
 
     IndexerProcess(Clock& clock, IndexerOptions options);
@@ -46,7 +46,7 @@ class IndexerProcess final : public DeviceDataIndex {
     ScanReport lastReport() const override;
     void stop() override;
 
- private:
+  private:
     struct Waiter;
     struct ChildReport;
     enum class Outcome { complete, crashed, failed };
