@@ -3,6 +3,7 @@
 
 #include <fmt/format.h>
 #include <poll.h>
+#include <pthread.h>
 
 #include <array>
 #include <atomic>
@@ -82,6 +83,7 @@ void BusLoop::stop() {
 }
 
 void BusLoop::run() {
+    pthread_setname_np(pthread_self(), "bus");
     sd_bus_slot* slot = nullptr;
     const int result =
         sd_bus_add_object(connection_.get(), &slot, bus::kPath, &BusLoop::onMessage, this);

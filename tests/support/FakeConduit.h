@@ -62,6 +62,16 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
     }
     void release() { gate_.signal(); }
 
+    /// Runs in the middle of clear, collect, bundle, purge and analytics.
+    void whileWorking(Task task) {
+        const std::lock_guard lock(mutex_);
+        working_ = std::move(task);
+    }
+    /// Returns when everything begun so far is replied to.
+    void settle() {
+        queue_.sync([] {});
+    }
+
     void storeEvents(KSEventArray events, KSConduitContext, Reply reply) override {
         enqueue("storeEvents", [this, events = std::move(events), reply = std::move(reply)] {
             std::unique_lock lock(mutex_);
@@ -165,7 +175,9 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
         enqueue(std::move(name), [this, reply = std::move(reply)] {
             std::unique_lock lock(mutex_);
             const auto error = error_;
+            const auto working = working_;
             lock.unlock();
+            if (working) working();
             reply(error);
         });
     }
@@ -179,6 +191,7 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
     std::vector<std::string> calls_;
     KSEventFetchOptions eventOptions_;
     KSEventBundleFetchOptions bundleOptions_;
+    Task working_;
     Semaphore gate_;
     WorkQueue queue_{"fake conduit"};
 };
