@@ -43,7 +43,7 @@ if [ "$stage" = start ]; then
 
     folders=()
     for folder in "$@"; do
-        [ -d "$caller/$folder" ] && folder=$caller/$folder
+        [[ $folder = /* ]] || folder=$caller/$folder
         [ -d "$folder" ] || { echo "not a folder: $folder" >&2; exit 2; }
         folders+=("$(realpath "$folder")")
     done
@@ -77,11 +77,14 @@ if [ "$stage" = start ]; then
         now=$(date -d "$(date -d "@$unix" +%F) + $((8 - weekday)) days" +%FT%T%:z)
     fi
 
+    # Assigned first: a failure inside the text below would go unnoticed.
+    track_folders=$(toml_strings "${tracks[@]}")
+    photo_folders=$(toml_strings "${photos[@]}")
     mkdir -p "$XDG_CONFIG_HOME/keepsakesd"
     cat >"$XDG_CONFIG_HOME/keepsakesd/config.toml" <<EOF
 [device_data]
-tracks    = [$(toml_strings "${tracks[@]}")]
-photos    = [$(toml_strings "${photos[@]}")]
+tracks    = [$track_folders]
+photos    = [$photo_folders]
 calendars = []
 messages  = []
 contacts  = []
