@@ -106,7 +106,7 @@ KSDate fromLocal(KSDate local) {
     if (!basic) return local;
     basic->getOffsetFromLocal(toICU(local), UCAL_TZ_LOCAL_FORMER, UCAL_TZ_LOCAL_FORMER, raw, saving,
                               status);
-    return U_SUCCESS(status) ? local - (raw + saving) / 1000 : local;
+    return U_SUCCESS(status) ? local - (raw + saving) / 1000.0 : local;
 }
 
 std::string fullDateLongTime(KSDate date) {

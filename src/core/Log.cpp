@@ -48,6 +48,7 @@ const char* journalPrefix(spdlog::level::level_enum level) {
 struct Logger {
     std::shared_ptr<spdlog::logger> logger =
         std::make_shared<spdlog::logger>("", std::make_shared<spdlog::sinks::stderr_sink_mt>());
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing in the daemon changes the environment
     bool toJournal = std::getenv("JOURNAL_STREAM") != nullptr;
 
     Logger() {

@@ -204,8 +204,11 @@ void WorkQueue::sync(const Task& task) {
     if (state_->runHereWhenIdle(task)) return;
 
     struct SignalAtEnd {
-        Semaphore semaphore;
+        explicit SignalAtEnd(Semaphore toSignal) : semaphore(std::move(toSignal)) {}
         ~SignalAtEnd() { semaphore.signal(); }
+        SignalAtEnd(const SignalAtEnd&) = delete;
+        SignalAtEnd& operator=(const SignalAtEnd&) = delete;
+        Semaphore semaphore;
     };
     Semaphore done;
     async([&task, done] {

@@ -1,0 +1,155 @@
+#!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# Shows the daemon at work: collects, bundles and prints what it would suggest.
+#   scripts/demo.sh                 the sample recordings of data/sample, a weekend of June 2024
+#   scripts/demo.sh FOLDER...       your own recordings, at the end of the last week they hold
+# Nothing of yours is changed: the daemon runs on a message bus of its own and keeps its database in
+# a temporary folder that is removed at the end. Folders given are only read.
+set -euo pipefail
+
+stage=start
+if [ "${1:-}" = --inside-bus ]; then
+    stage=inside
+    shift
+fi
+
+caller=$PWD
+cd "$(dirname "$0")/.."
+. scripts/common.sh
+bin=$PWD/build/release/bin
+
+# toml_strings PATH...: the paths as the inside of a TOML array.
+toml_strings() {
+    local path separator=
+    for path in "$@"; do
+        path=${path//\\/\\\\}
+        path=${path//\"/\\\"}
+        # The configuration expands $NAME; nothing here means that.
+        case $path in *'$'*) echo "a folder's name must not hold a \$: $path" >&2; return 1 ;; esac
+        printf '%s"%s"' "$separator" "$path"
+        separator=', '
+    done
+}
+
+# newest_record INDEX: the end of the newest workout or photo occasion, in seconds since 2001.
+newest_record() {
+    sqlite3 -readonly "$1" "SELECT max(moment) FROM (SELECT max(end) AS moment FROM workouts
+                            UNION ALL SELECT max(end) FROM occasions)"
+}
+
+if [ "$stage" = start ]; then
+    scripts/install-dependencies.sh build test
+    build release
+
+    folders=()
+    for folder in "$@"; do
+        [[ $folder = /* ]] || folder=$caller/$folder
+        [ -d "$folder" ] || { echo "not a folder: $folder" >&2; exit 2; }
+        folders+=("$(realpath "$folder")")
+    done
+
+    home=$(mktemp -d --tmpdir keepsakes-demo.XXXXXX)
+    trap 'rm -rf "$home"' EXIT
+    export HOME=$home XDG_CACHE_HOME=$home/cache XDG_CONFIG_HOME=$home/config
+    export XDG_STATE_HOME=$home/state XDG_DATA_HOME=$home/data XDG_RUNTIME_DIR=$home/run
+    mkdir -m 700 "$XDG_RUNTIME_DIR"
+
+    if [ ${#folders[@]} -eq 0 ]; then
+        tracks=("$PWD/data/sample/tracks")
+        photos=("$PWD/data/sample/photos")
+        export TZ=Europe/Vienna
+        now=2024-06-16T20:00:00+02:00
+    else
+        tracks=("${folders[@]}")
+        photos=("${folders[@]}")
+        echo "reading ${folders[*]}"
+        "$bin/keepsakes-indexer" --index "$home/look.sqlite" --tracks "${tracks[@]}" \
+            --photos "${photos[@]}" --human
+        newest=$(newest_record "$home/look.sqlite")
+        if [ -z "$newest" ]; then
+            echo "There is neither a workout nor a photo occasion in these folders, so there is" \
+                 "nothing to suggest. The lines above say which files were passed over and why."
+            exit 1
+        fi
+        # Midnight after the Sunday that ends the week of the newest record.
+        unix=$((${newest%.*} + 978307200))
+        weekday=$(date -d "@$unix" +%u)
+        now=$(date -d "$(date -d "@$unix" +%F) + $((8 - weekday)) days" +%FT%T%:z)
+    fi
+
+    # Assigned first: a failure inside the text below would go unnoticed.
+    track_folders=$(toml_strings "${tracks[@]}")
+    photo_folders=$(toml_strings "${photos[@]}")
+    mkdir -p "$XDG_CONFIG_HOME/keepsakesd"
+    cat >"$XDG_CONFIG_HOME/keepsakesd/config.toml" <<EOF
+[device_data]
+tracks    = [$track_folders]
+photos    = [$photo_folders]
+calendars = []
+messages  = []
+contacts  = []
+places    = []
+media     = false
+[activities]                # nothing runs but what this script asks for
+collection = "0"
+compute    = "0"
+purge      = "0"
+EOF
+    status=0
+    dbus-run-session -- "$0" --inside-bus "$now" ${folders[@]+"${folders[@]}"} || status=$?
+    exit "$status"
+fi
+
+# From here on: inside the private bus.
+now=$1
+shift
+log=$HOME/daemon.log
+"$bin/keepsakesd" --config "$XDG_CONFIG_HOME/keepsakesd/config.toml" --now "$now" 2>"$log" &
+daemon=$!
+stop() {
+    kill -TERM "$daemon" 2>/dev/null || true
+    wait "$daemon" || { echo "the daemon did not end in order:" >&2; cat "$log" >&2; return 1; }
+}
+fail() {
+    echo "$1" >&2
+    cat "$log" >&2
+    kill -TERM "$daemon" 2>/dev/null || true
+    wait "$daemon" 2>/dev/null || true
+    exit 1
+}
+
+for ((attempt = 0; ; ++attempt)); do
+    "$bin/keepsakesctl" status >/dev/null 2>&1 && break
+    kill -0 "$daemon" 2>/dev/null || fail "the daemon did not start:"
+    [ "$attempt" -lt 100 ] || fail "the daemon did not answer within 10 seconds:"
+    sleep 0.1
+done
+
+step() {
+    echo
+    echo "\$ keepsakesctl $*"
+    "$bin/keepsakesctl" "$@" || fail "keepsakesctl $* failed with status $?; the daemon's log:"
+}
+
+echo "It is $now for the daemon."
+step collect
+step bundle
+step events
+step bundles
+step status
+
+count() { "$bin/keepsakesctl" "$1" --json | python3 -c 'import json, sys; print(len(json.load(sys.stdin)))'; }
+events=$(count events)
+bundles=$(count bundles)
+stop || exit 1
+
+echo
+echo "$events events and $bundles bundles."
+if [ "$#" -gt 0 ]; then
+    cat <<EOF
+What limits this: a collection looks back over the last weeks before $now only;
+files that cannot be read, or that carry no time, are passed over (status names them above);
+a bundle needs events that overlap in time, such as photos taken during a recorded walk.
+EOF
+fi
+[ "$events" -gt 0 ]
