@@ -82,7 +82,7 @@ std::optional<std::string> readWords(const FetchWords& words, Options& options) 
         if (!time) return fmt::format("\"{}\" is not a time; see --help", word);
         (isStart ? window.start : window.end) = isStart ? time->date : time->end();
     }
-    if (window.end < window.start) return "--until lies before --since";
+    if (window.end <= window.start) return "--until lies before --since";
     options.dateInterval = window;
     return std::nullopt;
 }

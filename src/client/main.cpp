@@ -21,6 +21,11 @@ class CommandLine {
         addDefaults();
         app_.set_version_flag("--version", KEEPSAKES_VERSION);
         app_.require_subcommand(1);
+        // The parser itself would only say that a command is missing.
+        const std::string first = argc > 1 ? argv[1] : "-";
+        if (!first.starts_with('-') && !app_.get_subcommand_no_throw(first)) {
+            return Console(false).usage("no command \"" + first + "\"; see --help");
+        }
         try {
             app_.parse(argc, argv);
         } catch (const CLI::ParseError& error) {
