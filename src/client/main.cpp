@@ -23,7 +23,8 @@ class CommandLine {
         app_.require_subcommand(1);
         // The parser itself would only say that a command is missing.
         const std::string first = argc > 1 ? argv[1] : "-";
-        if (!first.starts_with('-') && !app_.get_subcommand_no_throw(first)) {
+        const auto isFirst = [&first](CLI::App* command) { return command->get_name() == first; };
+        if (!first.starts_with('-') && app_.get_subcommands(isFirst).empty()) {
             return Console(false).usage("no command \"" + first + "\"; see --help");
         }
         try {
