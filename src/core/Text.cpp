@@ -18,6 +18,10 @@ std::string lowerCased(std::string_view text) {
 }
 
 bool isPlainUtf8(std::string_view text) {
+    // Nearly all text is ASCII, and this much of the test the compiler makes fast.
+    bool ascii = true;
+    for (const char byte : text) ascii &= byte > 0;
+    if (ascii) return true;
     const auto* bytes = reinterpret_cast<const std::uint8_t*>(text.data());
     const auto size = static_cast<std::int64_t>(text.size());
     for (std::int64_t at = 0; at < size;) {

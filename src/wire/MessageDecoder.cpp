@@ -72,10 +72,25 @@ bool MessageDecoder::exit() {
     return result >= 0 || failMessage(result);
 }
 
-bool MessageDecoder::more(bool& any) {
-    const int result = sd_bus_message_at_end(message_, 0);
-    any = result == 0;
+bool MessageDecoder::enterNext(char type, const char* contents, bool& any) {
+    const int result = sd_bus_message_enter_container(message_, type, contents);
+    any = result > 0;
     return result >= 0 || failMessage(result);
+}
+
+// Asking for the type first costs as much as opening, so the likely one is tried.
+bool MessageDecoder::open(const char* likely) {
+    if (!closed_) return true;
+    int result = likely ? sd_bus_message_enter_container(message_, 'v', likely) : -ENXIO;
+    if (result == -ENXIO) {
+        char type = 0;
+        result = sd_bus_message_peek_type(message_, &type, &likely);
+        if (result > 0) result = sd_bus_message_enter_container(message_, 'v', likely);
+    }
+    if (result <= 0) return failMessage(result == 0 ? -ENXIO : result);
+    type_ = likely;
+    closed_ = false;
+    return true;
 }
 
 bool MessageDecoder::basic(char type, void* value) {
@@ -105,27 +120,21 @@ bool MessageDecoder::stand() {
 template <class Read>
 bool MessageDecoder::eachEntry(const Read& read) {
     const auto outer = type_;
-    const std::string inside(outer.substr(2, outer.size() - 3));
+    const bool variants = outer == "a{sv}";
+    const std::string inside(variants ? "sv" : outer.substr(2, outer.size() - 3));
     if (!enter('a', outer.data() + 1)) return false;
-    for (bool any = false;;) {
-        if (!more(any)) return false;
+    for (bool any = true;;) {
+        if (!enterNext('e', inside.c_str(), any)) return false;
         if (!any) break;
         type_ = "s";
         const char* key = nullptr;
-        if (!enter('e', inside.c_str()) || !text(key)) return false;
+        if (!text(key)) return false;
         path_.push_back({key});
-        if (inside != "sv") {
-            type_ = std::string_view(inside).substr(1);
-            if (!read(std::string_view(key))) return false;
-        } else {
-            char type = 0;
-            const char* contents = nullptr;
-            const int result = sd_bus_message_peek_type(message_, &type, &contents);
-            if (result <= 0) return failMessage(result);
-            if (!enter('v', contents)) return false;
-            type_ = contents;
-            if (!read(std::string_view(key)) || !exit()) return false;
-        }
+        type_ = std::string_view(inside).substr(1);
+        closed_ = variants;
+        if (!read(std::string_view(key))) return false;
+        if (closed_ && !skip()) return false;
+        if (variants && !exit()) return false;
         path_.pop_back();
         if (!exit()) return false;
     }
@@ -137,10 +146,10 @@ template <class Read>
 bool MessageDecoder::eachElement(const Read& read) {
     const auto outer = type_;
     if (!enter('a', outer.data() + 1)) return false;
-    bool any = false;
     for (std::size_t index = 0;; ++index) {
-        if (!more(any)) return false;
-        if (!any) break;
+        const int ended = sd_bus_message_at_end(message_, 0);
+        if (ended < 0) return failMessage(ended);
+        if (ended > 0) break;
         type_ = outer.substr(1);
         path_.push_back({{}, index});
         if (!read()) return false;
@@ -151,6 +160,7 @@ bool MessageDecoder::eachElement(const Read& read) {
 }
 
 bool MessageDecoder::readBool(bool& value) {
+    if (!open("b")) return false;
     if (!is("b")) return fail("not a boolean");
     int wide = 0;
     if (!basic('b', &wide)) return false;
@@ -185,6 +195,7 @@ bool MessageDecoder::integer(KSValue& value) {
 }
 
 bool MessageDecoder::readUnsigned(std::uint64_t& value) {
+    if (!open("t")) return false;
     if (type_.size() != 1 || !kIntegers.contains(type_[0])) return fail("not an integer");
     const bool isSigned = !is("t");
     KSValue read;
@@ -208,11 +219,13 @@ bool MessageDecoder::number(char type, double& value) {
 }
 
 bool MessageDecoder::readNumber(double& value) {
+    if (!open("d")) return false;
     if (type_.size() != 1 || !isNumber(type_[0])) return fail("not a number");
     return number(type_[0], value);
 }
 
 bool MessageDecoder::readString(std::string& value) {
+    if (!open("s")) return false;
     if (!is("s")) return fail("not a string");
     const char* read = nullptr;
     if (!text(read)) return false;
@@ -221,11 +234,13 @@ bool MessageDecoder::readString(std::string& value) {
 }
 
 bool MessageDecoder::readStrings(std::vector<std::string>& value) {
+    if (!open("as")) return false;
     if (!is("as")) return fail("not an array of strings");
     return eachElement([&] { return readString(value.emplace_back()); });
 }
 
 bool MessageDecoder::readUUID(KSUUID& value) {
+    if (!open("s")) return false;
     if (!is("s")) return fail("not a UUID");
     const char* read = nullptr;
     if (!text(read)) return false;
@@ -236,6 +251,7 @@ bool MessageDecoder::readUUID(KSUUID& value) {
 }
 
 bool MessageDecoder::readDate(KSDate& value) {
+    if (!open("d")) return false;
     if (type_.size() != 1 || !isNumber(type_[0])) return fail("not a date");
     if (!number(type_[0], value.seconds)) return false;
     return std::isfinite(value.seconds) || fail("not a finite date");
@@ -248,6 +264,7 @@ bool MessageDecoder::pair(double& first, double& second) {
 }
 
 bool MessageDecoder::readInterval(KSDateInterval& value) {
+    if (!open("(dd)")) return false;
     const bool isPair =
         type_.size() == 4 && type_[0] == '(' && isNumber(type_[1]) && isNumber(type_[2]);
     if (!isPair) return fail("not a date interval");
@@ -257,6 +274,7 @@ bool MessageDecoder::readInterval(KSDateInterval& value) {
 }
 
 bool MessageDecoder::readLocation(double& latitude, double& longitude) {
+    if (!open("(dd)")) return false;
     const bool isPair =
         type_.size() == 4 && type_[0] == '(' && isNumber(type_[1]) && isNumber(type_[2]);
     if (!isPair) return fail("not a location");
@@ -265,6 +283,7 @@ bool MessageDecoder::readLocation(double& latitude, double& longitude) {
 }
 
 bool MessageDecoder::readJson(KSDictionary& value) {
+    if (!open("ay")) return false;
     if (!is("ay")) return fail("not JSON bytes");
     const void* bytes = nullptr;
     std::size_t size = 0;
@@ -279,11 +298,13 @@ bool MessageDecoder::readJson(KSDictionary& value) {
 }
 
 bool MessageDecoder::readDictionary(KSDictionary& value) {
+    if (!open("a{sv}")) return false;
     if (!type_.starts_with("a{s")) return fail("not a record");
     return dictionary(value, 1);
 }
 
 bool MessageDecoder::readDictionaries(std::vector<KSDictionary>& value) {
+    if (!open("aa{sv}")) return false;
     if (!type_.starts_with("aa{s")) return fail("not an array of records");
     return eachElement([&] { return dictionary(value.emplace_back(), 2); });
 }
@@ -313,7 +334,7 @@ bool MessageDecoder::array(KSValue& value, std::size_t depth) {
 }
 
 bool MessageDecoder::value(KSValue& value, std::size_t depth) {
-    if (!spend(kValueCost)) return false;
+    if (!open() || !spend(kValueCost)) return false;
     switch (type_[0]) {
         case 'b': {
             bool read = false;
@@ -372,19 +393,20 @@ bool MessageDecoder::value(KSValue& value, std::size_t depth) {
 }
 
 bool MessageDecoder::readRecord(const ReadField& field) {
-    if (!stand()) return false;
+    if (!stand() || !open("a{sv}")) return false;
     if (!is("a{sv}")) return fail("not a record");
     return eachEntry([&](std::string_view key) { return field(key, *this); });
 }
 
 bool MessageDecoder::readRecords(const std::function<bool(KeyedDecoder&)>& element) {
-    if (!stand()) return false;
+    if (!stand() || !open("aa{sv}")) return false;
     if (!is("aa{sv}")) return fail("not an array of records");
     return eachElement([&] { return spend(kRecordCost) && element(*this); });
 }
 
 // The library's own way to skip does not tell how much that was. The bus bounds the nesting.
 bool MessageDecoder::skip() {
+    if (!open()) return false;
     const char type = type_[0];
     if (type == 'a' && kTrivials.contains(type_[1])) {
         const void* items = nullptr;

@@ -62,13 +62,16 @@ class MessageDecoder final : public KeyedDecoder {
     };
 
     bool stand();
+    /// Opens the variant that this stands before, if any; `likely` is the type to expect.
+    bool open(const char* likely = nullptr);
     bool failMessage(int result);
     bool is(std::string_view type) const { return type_ == type; }
     bool isNumber(char type) const;
     bool spend(std::size_t bytes);
     bool enter(char type, const char* contents);
+    /// As `enter`, where there may be nothing more.
+    bool enterNext(char type, const char* contents, bool& any);
     bool exit();
-    bool more(bool& any);
     bool basic(char type, void* value);
     bool number(char type, double& value);
     bool text(const char*& value);
@@ -88,6 +91,7 @@ class MessageDecoder final : public KeyedDecoder {
     sd_bus_message* message_;
     std::string_view what_;
     std::string_view type_;  ///< Of the value that this stands on; null-terminated.
+    bool closed_ = false;    ///< That value is a variant which is not opened yet.
     std::vector<Step> path_;
     std::string error_;
     std::size_t cost_ = 0;

@@ -117,7 +117,7 @@ bool MessageEncoder::tooLarge() const {
 // The library sends whatever fits its own bounds, and the bus then ends the connection of who sent
 // too much: the body is measured here, by the marshalling rules, before anything is appended.
 void MessageEncoder::account(std::size_t alignment, std::size_t bytes) {
-    size_ = (size_ + alignment - 1) / alignment * alignment + bytes;
+    size_ = ((size_ + alignment - 1) & ~(alignment - 1)) + bytes;
     if (size_ > bus::kLargestArray) check(-E2BIG);
 }
 

@@ -1,0 +1,238 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "client/Commands.h"
+
+#include <fmt/format.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <iostream>
+
+#include "client/RecordJson.h"
+#include "client/Words.h"
+#include "core/Calendar.h"
+#include "core/Clock.h"
+#include "core/Json.h"
+
+namespace keepsakes {
+
+namespace {
+
+constexpr std::string_view kMinutePattern = "yyyy-MM-dd HH:mm";
+
+std::string shown(std::optional<KSDate> date) {
+    if (!date || date->seconds <= KSDate::kDistantPast || date->seconds >= KSDate::kDistantFuture) {
+        return "-";
+    }
+    return calendar::format(*date, kMinutePattern);
+}
+
+/// The end without its day when that is the start's.
+std::string shownEnd(KSDate start, KSDate end) {
+    const bool sameDay = calendar::startOfDay(start) == calendar::startOfDay(end);
+    return sameDay ? calendar::format(end, "HH:mm") : shown(end);
+}
+
+/// What tells one event from another of its kind.
+std::string detailsOf(const KSEvent& event) {
+    std::string details;
+    const auto add = [&details](const std::optional<std::string>& part) {
+        if (!part || part->empty()) return;
+        if (!details.empty()) details += ", ";
+        details += *part;
+    };
+    add(event.workoutType);
+    add(event.placeName);
+    add(event.suggestedEventTitle);
+    add(event.tripTitle);
+    add(event.mediaTitle);
+    add(event.mediaArtist);
+    add(event.itemDisplayName ? event.itemDisplayName : event.itemLinkTitle);
+    if (details.empty() && event.location) {
+        details =
+            fmt::format("{:.5f}, {:.5f}", event.location->latitude, event.location->longitude);
+    }
+    if (details.empty()) add(event.identifierFromProvider);
+    return details;
+}
+
+std::string eventTable(const KSEventArray& events, const Screen& screen, std::size_t indent = 0) {
+    Table table({"Start", "End", "Category", "Provider", "Details"});
+    for (const auto& event : events) {
+        table.add({shown(event->startDate()), shownEnd(event->startDate(), event->endDate()),
+                   event->describeCategory(), event->describeProvider(), detailsOf(*event)});
+    }
+    return table.text(screen, indent);
+}
+
+std::string counted(std::size_t count, std::string_view what) {
+    return fmt::format("{} {}{}\n", count, what, count == 1 ? "" : "s");
+}
+
+/// Fills what both kinds of options share; the text of a usage error, or none.
+template <class Options>
+std::optional<std::string> readWords(const FetchWords& words, Options& options) {
+    options.ascending = !words.descending;
+    if (words.limit) options.limit = static_cast<double>(*words.limit);
+    if (words.since.empty() && words.until.empty()) return std::nullopt;
+    KSDateInterval window{KSDate::distantPast(), KSDate::distantFuture()};
+    const auto now = SystemClock().now();
+    for (const auto& [word, isStart] : {std::pair(words.since, true), {words.until, false}}) {
+        if (word.empty()) continue;
+        const auto time = parseTime(word, now);
+        if (!time) return fmt::format("\"{}\" is not a time; see --help", word);
+        (isStart ? window.start : window.end) = isStart ? time->date : time->end();
+    }
+    if (window.end <= window.start) return "--until lies before --since";
+    options.dateInterval = window;
+    return std::nullopt;
+}
+
+std::string statusJson(const DaemonStatus& status) {
+    KSDictionary entries{{"Version", status.version},
+                         {"DatabaseAvailable", status.databaseAvailable},
+                         {"LastCollection", status.lastCollection},
+                         {"CollectEnabled", status.collectEnabled},
+                         {"ComputeEnabled", status.computeEnabled},
+                         {"PurgeEnabled", status.purgeEnabled},
+                         {"EventCount", status.eventCount},
+                         {"BundleCount", status.bundleCount},
+                         {"FilesIndexed", status.filesIndexed},
+                         {"FilesRefused", status.filesRefused},
+                         {"Problems", KSArray(status.problems.begin(), status.problems.end())}};
+    if (status.lastCollection != 0) entries["LastCollection"] = KSDate{status.lastCollection};
+    return jsonText(jsonForm(KSValue(entries))).value_or("{}") + "\n";
+}
+
+std::string statusText(const DaemonStatus& status, const Screen& screen) {
+    const auto onOff = [](bool on) { return on ? "on" : "off"; };
+    const auto last = status.lastCollection == 0
+                          ? "never"
+                          : calendar::shortDateLongTime(KSDate{status.lastCollection});
+    std::string text = screen.bold("keepsakesd " + printable(status.version)) + "\n";
+    text += fmt::format("  Database         {}\n",
+                        status.databaseAvailable ? "available" : "not available");
+    text += fmt::format("  Last collection  {}\n", last);
+    text += fmt::format("  Activities       collection {}, compute {}, purge {}\n",
+                        onOff(status.collectEnabled), onOff(status.computeEnabled),
+                        onOff(status.purgeEnabled));
+    text += fmt::format("  Stored           {} events, {} bundles\n", status.eventCount,
+                        status.bundleCount);
+    text += fmt::format("  Files            {} indexed, {} refused\n", status.filesIndexed,
+                        status.filesRefused);
+    if (status.problems.empty()) return text + "  Problems         none\n";
+    text += "  Problems\n";
+    for (const auto& problem : status.problems) text += "    " + printable(problem) + "\n";
+    return text;
+}
+
+std::string bundleText(const KSEventBundle& bundle, const Screen& screen) {
+    const auto title = printable(bundle.promptLanguage.value_or("(no prompt)"));
+    const auto start = bundle.startDate.value_or(bundle.creationDate());
+    const auto end = bundle.endDate.value_or(start);
+    auto text = fmt::format("{}\n  {} to {}{}\n", screen.bold(title), shown(start),
+                            shownEnd(start, end), bundle.filtered ? ", by a rule" : "");
+    return text + eventTable(bundle.events, screen, 2);
+}
+
+bool confirmed() {
+    fmt::print(stderr, "Delete every stored event and bundle? [y/N] ");
+    std::string line;
+    std::getline(std::cin, line);
+    return line == "y" || line == "Y" || line == "yes";
+}
+
+}  // namespace
+
+int showStatus(const Console& console) {
+    const auto client = console.connect();
+    if (!client) return console.fail(client.error());
+    const auto status = (*client)->status();
+    if (!status) return console.fail(status.error());
+    return console.print(console.json() ? statusJson(*status)
+                                        : statusText(*status, console.screen()));
+}
+
+int showEvents(const Console& console, const FetchWords& words) {
+    KSEventFetchOptions options;
+    if (const auto wrong = readWords(words, options)) return console.usage(*wrong);
+    if (!words.category.empty()) {
+        const auto category = parseCategory(words.category);
+        if (!category) {
+            return console.usage(
+                fmt::format("no category \"{}\"; there are: {}", words.category, categoryNames()));
+        }
+        options.category = *category;
+    }
+    const auto client = console.connect();
+    if (!client) return console.fail(client.error());
+    const auto events = (*client)->fetchEventsWithOptions(options);
+    if (!events) return console.fail(events.error());
+    if (console.json()) return console.print(jsonRecords(*events));
+    const auto table = events->empty() ? "" : eventTable(*events, console.screen());
+    return console.print(table + counted(events->size(), "event"));
+}
+
+int showBundles(const Console& console, const FetchWords& words) {
+    KSEventBundleFetchOptions options;
+    options.filterBundle = words.filtered;
+    if (const auto wrong = readWords(words, options)) return console.usage(*wrong);
+    const auto client = console.connect();
+    if (!client) return console.fail(client.error());
+    const auto bundles = (*client)->fetchEventBundlesWithOptions(options);
+    if (!bundles) return console.fail(bundles.error());
+    if (console.json()) return console.print(jsonRecords(*bundles));
+    std::string text;
+    for (const auto& bundle : *bundles) text += bundleText(*bundle, console.screen()) + "\n";
+    return console.print(text + counted(bundles->size(), "bundle"));
+}
+
+int showTrends(const Console& console, const std::string& file) {
+    KSEventArray events;
+    if (!file.empty()) {
+        const auto text = readInput(file);
+        if (!text) return console.fail(text.error());
+        auto given = eventsFromJson(*text);
+        if (!given) return console.fail(given.error());
+        events = std::move(*given);
+    }
+    const auto client = console.connect();
+    if (!client) return console.fail(client.error());
+    if (file.empty()) {
+        KSEventFetchOptions options;
+        options.ascending = true;
+        auto stored = (*client)->fetchEventsWithOptions(options);
+        if (!stored) return console.fail(stored.error());
+        events = std::move(*stored);
+    }
+    const auto trends = (*client)->analyzeTrendsInEvents(events);
+    console.endProgress();
+    if (!trends) return console.fail(trends.error());
+    if (console.json()) return console.print(jsonRecords(*trends));
+    Table table({"Start", "Category", "Details", "Trends"});
+    for (const auto& event : *trends) {
+        const auto found = jsonText(jsonForm(KSValue(event->trends.value_or(KSDictionary()))));
+        table.add({shown(event->startDate()), event->describeCategory(), detailsOf(*event),
+                   found.value_or("")});
+    }
+    return console.print((trends->empty() ? "" : table.text(console.screen())) +
+                         counted(trends->size(), "event"));
+}
+
+int doWork(const Console& console, Work work) {
+    const auto client = console.connect();
+    if (!client) return console.fail(client.error());
+    const auto error = ((**client).*work)();
+    if (error) return console.fail(*error);
+    console.endProgress();
+    return console.print(console.json() ? "{\"done\":true}\n" : "done\n");
+}
+
+int clearEvents(const Console& console, bool yes) {
+    if (!yes && !isatty(STDIN_FILENO)) {
+        return console.usage("clear deletes every stored event; say --yes to do so");
+    }
+    if (!yes && !confirmed()) return console.usage("nothing was deleted");
+    return doWork(console, &ConduitClient::clearEvents);
+}
+
+}  // namespace keepsakes
