@@ -131,7 +131,9 @@ step() {
     "$bin/keepsakesctl" "$@" || fail "keepsakesctl $* failed with status $?; the daemon's log:"
 }
 
-echo "It is $now for the daemon."
+echo "It is $now for the daemon, which looks back a week."
+"$bin/keepsakesctl" defaults write com.brindle.keepsakesd EventManagerEventCollectionStartDate \
+    "$(date -d "$now - 7 days" +%FT%T%:z)"
 step collect
 step bundle
 step events
@@ -147,7 +149,7 @@ echo
 echo "$events events and $bundles bundles."
 if [ "$#" -gt 0 ]; then
     cat <<EOF
-What limits this: a collection looks back over the last weeks before $now only;
+What limits this: this run looks at the week before $now only;
 files that cannot be read, or that carry no time, are passed over (status names them above);
 a bundle needs events that overlap in time, such as photos taken during a recorded walk.
 EOF

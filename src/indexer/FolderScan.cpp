@@ -263,7 +263,7 @@ class Scan {
     void readOpen(int fd, const ChangedFile& file, ReadOutcome& outcome) {
         try {
             outcome.hash = contentHash(fd, outcome.stamp.size).value_or("");
-            auto records = reader_.read(fd, file.wanted, options_.now);
+            auto records = reader_.read(fd, file.wanted, options_.latest);
             if (!records) {
                 outcome.refusal = {RefusalReason::damaged, std::move(records.error())};
             } else if (*records) {

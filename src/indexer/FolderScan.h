@@ -31,6 +31,9 @@ struct ScanOptions {
     std::vector<std::filesystem::path> tracks;  ///< Folders searched for tracks.
     std::vector<std::filesystem::path> photos;  ///< Folders searched for photos.
     KSDate now;
+    /// What files may claim as their time, at most: for a daemon that replays older recordings, the
+    /// system's time, so that its files are not taken for ones of the future.
+    KSDate latest = now;
 };
 
 /// Brings the index up to date with the owner's folders: stats every file, reads those that are

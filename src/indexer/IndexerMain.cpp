@@ -4,6 +4,7 @@
 #include <fmt/format.h>
 #include <sys/stat.h>
 #include <unistd.h>
+#include <algorithm>
 
 #include <charconv>
 #include <chrono>
@@ -119,7 +120,8 @@ std::optional<std::string> parse(std::span<char*> words, Arguments& arguments) {
 }
 
 int scan(const Arguments& arguments, FileReader& reader) {
-    const auto& options = arguments.scan;
+    auto options = arguments.scan;
+    options.latest = std::max(options.now, systemNow());
     const auto folder = std::filesystem::absolute(options.index).parent_path();
     if (const auto error = makePrivateFolder(folder)) {
         logError(error->description());

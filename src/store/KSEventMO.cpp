@@ -67,7 +67,7 @@ void read(const Column& column, KSDictionary& value) {
 }
 template <class T>
 void read(const Column& column, std::optional<T>& value) {
-    if (!column.isNull()) read(column, value.emplace());
+    read(column, value.emplace());
 }
 
 /// One column: how it is written, and how it is read back when it is part of the record's details.
@@ -227,7 +227,9 @@ KSEventPointer KSEventMO::initWithEventMO(SQLite::Statement& statement, int firs
         KSDate{column(3).getDouble()}, provider, category);
     for (int index = 0; index < kColumnCount; ++index) {
         const auto& attribute = kColumns[static_cast<std::size_t>(index)];
-        if (attribute.read) attribute.read(column(index), *event);
+        if (attribute.read && !statement.isColumnNull(firstColumn + index)) {
+            attribute.read(column(index), *event);
+        }
     }
     return event;
 }

@@ -40,8 +40,8 @@ class PlantedReader final : public TextReader {
         while (content.starts_with("hang")) ::pause();
         if (content.starts_with("eat")) {
             for (std::size_t size = 1 << 20; content.size() > 1; size *= 2) {
-                const auto block = std::make_unique<char[]>(size);
-                for (std::size_t i = 0; i < size; i += 4096) block[i] = 'x';
+                const auto block = std::make_unique_for_overwrite<char[]>(size);
+                *static_cast<volatile char*>(block.get()) = 'x';  // so that it is really asked for
                 if (size > (std::size_t{1} << 36)) return std::unexpected("was given 64 GiB");
             }
         }
