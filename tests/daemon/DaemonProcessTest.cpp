@@ -1,0 +1,156 @@
+// SPDX-License-Identifier: Apache-2.0
+// The daemon as a process on a bus of its own, with its indexer and real files.
+#include <SQLiteCpp/SQLiteCpp.h>
+#include <fcntl.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <fstream>
+#include <thread>
+
+#include "client/ConduitClient.h"
+#include "support/TemporaryFolder.h"
+#include "support/TestEvents.h"
+
+namespace keepsakes {
+namespace {
+
+using testing::HasSubstr;
+using testing::MatchesRegex;
+
+constexpr const char* kTrack =
+    R"(<gpx version="1.1"><trk><type>hiking</type><trkseg>)"
+    R"(<trkpt lat="47.5" lon="13.6"><time>2024-06-15T08:02:00Z</time></trkpt>)"
+    R"(<trkpt lat="47.6" lon="13.6"><time>2024-06-15T10:31:00Z</time></trkpt>)"
+    R"(</trkseg></trk></gpx>)";
+
+class DaemonProcess : public testing::Test {
+  protected:
+    DaemonProcess() {
+        setenv("XDG_CACHE_HOME", (folder / "cache").c_str(), 1);
+        setenv("XDG_CONFIG_HOME", (folder / "config").c_str(), 1);
+        setenv("XDG_STATE_HOME", (folder / "state").c_str(), 1);
+        std::filesystem::create_directories(folder / "tracks");
+        configure("tracks = [\"" + (folder / "tracks").string() + "\"]\nphotos = []\n");
+    }
+    ~DaemonProcess() override {
+        if (running > 0) end(SIGKILL);
+    }
+
+    void configure(const std::string& deviceData) {
+        folder.write("config/keepsakesd/config.toml", "[device_data]\n" + deviceData);
+    }
+
+    /// Starts a daemon whose log goes to a file; does not wait for it.
+    pid_t start() {
+        const pid_t child = fork();
+        if (child == 0) {
+            const int log = open((folder / "log").c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+            dup2(log, STDERR_FILENO);
+            execl(KEEPSAKESD, "keepsakesd", "--now", "2024-06-16T18:00:00Z", nullptr);
+            _exit(127);
+        }
+        return child;
+    }
+
+    /// Starts the daemon and waits until it answers.
+    void startAndConnect() {
+        running = start();
+        client = ConduitClient::connect().value();
+        while (!client->status()) {
+            ASSERT_EQ(waitpid(running, nullptr, WNOHANG), 0) << log();
+            std::this_thread::yield();
+        }
+    }
+
+    int end(int signal) {
+        kill(running, signal);
+        return exitStatusOf(std::exchange(running, 0));
+    }
+
+    static int exitStatusOf(pid_t child) {
+        int status = 0;
+        waitpid(child, &status, 0);
+        return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+    }
+
+    std::string log() const {
+        std::ifstream in(folder / "log");
+        return {std::istreambuf_iterator<char>(in), {}};
+    }
+
+    std::string integrity() const {
+        SQLite::Database database(
+            (folder / "cache/com.brindle.keepsakesd/keepsakesDataModel.sqlite").string(),
+            SQLite::OPEN_READWRITE);
+        return database.execAndGet("PRAGMA integrity_check").getString();
+    }
+
+    TemporaryFolder folder;
+    pid_t running = 0;
+    std::unique_ptr<ConduitClient> client;
+};
+
+TEST_F(DaemonProcess, WhatWasAnsweredOutlivesAKillAndFilesBecomeBundles) {
+    folder.write("tracks/hike.gpx", kTrack);
+    folder.write("tracks/broken.gpx", "<gpx><trk>");
+    startAndConnect();
+    ASSERT_FALSE(client->storeEvents({makeWorkout(1, 700000000, 700000600, "Running")}));
+    ASSERT_FALSE(client->collectEvents());
+    ASSERT_FALSE(client->bundleEvents());
+    EXPECT_EQ(end(SIGKILL), -SIGKILL);
+    EXPECT_EQ(integrity(), "ok");
+
+    startAndConnect();
+    const auto events = client->fetchEventsWithOptions({.ascending = true}).value();
+    ASSERT_EQ(events.size(), 2u);
+    EXPECT_EQ(events[0]->workoutType, "Running");
+    EXPECT_EQ(events[1]->workoutType, "Hiking");
+    const auto bundles = client->fetchEventBundlesWithOptions({}).value();
+    ASSERT_EQ(bundles.size(), 1u);
+    EXPECT_THAT(*bundles[0]->promptLanguage, HasSubstr("A cardio workout: Hiking, Saturday"));
+    ASSERT_FALSE(client->collectEvents());
+    const auto status = client->status().value();
+    EXPECT_EQ(status.filesRefused, 1u);
+    ASSERT_EQ(status.problems.size(), 1u);
+    EXPECT_THAT(status.problems[0], HasSubstr("broken.gpx"));
+    EXPECT_EQ(client->fetchEventsWithOptions({}).value().size(), 2u) << "collected once";
+    EXPECT_EQ(end(SIGTERM), 0);
+}
+
+TEST_F(DaemonProcess, SigtermDuringACollectionEndsInOrder) {
+    for (int file = 0; file < 300; ++file) {
+        folder.write("tracks/" + std::to_string(file) + ".gpx", kTrack);
+    }
+    startAndConnect();
+    std::thread caller([] {
+        const auto other = ConduitClient::connect().value();
+        static_cast<void>(other->collectEvents());
+    });
+    // The first sign of the collection is its date on disk.
+    while (client->status().value().lastCollection == 0) std::this_thread::yield();
+    EXPECT_EQ(end(SIGTERM), 0) << log();
+    caller.join();
+    EXPECT_EQ(integrity(), "ok");
+}
+
+TEST_F(DaemonProcess, ASecondDaemonSaysThatTheNameIsTaken) {
+    startAndConnect();
+    const pid_t second = start();
+    EXPECT_EQ(exitStatusOf(second), 1);
+    EXPECT_THAT(log(), HasSubstr("taken"));
+    EXPECT_TRUE(client->status());
+}
+
+TEST_F(DaemonProcess, ABadConfigurationIsNamedInOneLine) {
+    configure("tracks = []\nfotos = []\n");
+    EXPECT_EQ(exitStatusOf(start()), 1);
+    EXPECT_THAT(log(), MatchesRegex("keepsakesd: [^\n]*config.toml:3: device_data.fotos:[^\n]*\n"));
+}
+
+}  // namespace
+}  // namespace keepsakes

@@ -1,0 +1,181 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "service/KSDaemonClient.h"
+
+#include <gmock/gmock.h>
+
+#include <set>
+
+#include "StoreFixture.h"
+#include "bundle/KSEventBundleManager.h"
+#include "bundle/KSEventBundleStore.h"
+#include "collect/KSEventManager.h"
+#include "model/ValueCoding.h"
+#include "notify/KSDaemonSPINotifier.h"
+#include "notify/KSDispatcher.h"
+#include "service/KSManageServer.h"
+#include "service/StatusReporter.h"
+#include "sources/KSPhotoManager.h"
+#include "sources/KSVitalsManager.h"
+#include "store/KSDefaultsManager.h"
+#include "support/RecordedAssertions.h"
+
+namespace keepsakes {
+namespace {
+
+using testing::ElementsAre;
+
+class Client : public StoreFixture {
+  protected:
+    Client() {
+        universe->add("EventStore", store);
+        universe->add("EventBundleStore", KSEventBundleStore::initWithUniverse(*universe));
+        universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
+        universe->add("PhotoManager", KSPhotoManager::initWithUniverse(*universe));
+        universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
+        universe->add("EventManager", KSEventManager::initWithUniverse(*universe));
+        universe->add("EventBundleManager", KSEventBundleManager::initWithUniverse(*universe));
+        server = KSManageServer::initWithUniverse(*universe);
+        listener = KSDispatcher::initWithNotifier(server->getNotifier());
+        for (std::int32_t identifier = 0; identifier <= 5; ++identifier) {
+            listener->registerForNotification(
+                identifier, [this](std::int32_t sent, const KSValue& payload) {
+                    heard.push_back(std::to_string(sent) + " " + payload.description());
+                });
+        }
+    }
+    ~Client() override { listener->invalidate(); }
+
+    KSDaemonClient& client() { return server->client(); }
+
+    static KSConduitContext callingAs(const std::string& name) {
+        const KSValue archive(KSDictionary{{"ProcessName", name}});
+        ValueDecoder decoder(archive);
+        KSConduitContext context;
+        KSConduitContext::initWithCoder(decoder, context);
+        return context;
+    }
+
+    /// "" for no error, once all is at rest.
+    template <class Call>
+    std::string errorOf(Call call) {
+        std::string text = "(no answer)";
+        call([&text](const OptionalError& error) { text = error ? error->description() : ""; });
+        WorkerThreads::shared().settle();
+        return text;
+    }
+
+    std::vector<std::string> takeHeard() {
+        WorkerThreads::shared().settle();
+        return std::exchange(heard, {});
+    }
+
+    std::shared_ptr<KSManageServer> server;
+    std::shared_ptr<KSDispatcher> listener;
+    std::vector<std::string> heard;
+};
+
+TEST_F(Client, AnnouncesWhatItDidAndForWhom) {
+    const auto context = callingAs("diary");
+    EXPECT_EQ(errorOf([&](auto reply) {
+                  client().storeEvents({makeWorkout(1, 1, 2, "Running")}, context, reply);
+              }),
+              "");
+    EXPECT_EQ(errorOf([&](auto reply) { client().collectEvents(context, reply); }), "");
+    client().fetchEventsWithOptions(
+        {}, context,
+        [](const KSEventArray& events, const OptionalError&) { EXPECT_EQ(events.size(), 1u); });
+    WorkerThreads::shared().settle();
+    EXPECT_EQ(errorOf([&](auto reply) { client().bundleEvents(context, reply); }), "");
+    client().fetchEventBundlesWithOptions({}, context,
+                                          [](const KSEventBundleArray&, const OptionalError&) {});
+    WorkerThreads::shared().settle();
+    EXPECT_EQ(errorOf([&](auto reply) { client().purgeEvents(context, reply); }), "");
+    EXPECT_EQ(errorOf([&](auto reply) { client().runAnalytics(context, reply); }),
+              "Analytics Plans are not avaialble");
+    EXPECT_EQ(errorOf([&](auto reply) { client().clearEvents(context, reply); }), "");
+    EXPECT_THAT(
+        takeHeard(),
+        ElementsAre(R"(2 {"resultNumberOfEvents": 0, "stateDatabaseAvailable": true, )"
+                    R"("triggerSource": "diary"})",
+                    R"(0 {"resultNumberOfEvents": 1, "triggerSource": "diary"})",
+                    R"(3 {"stateDatabaseAvailable": true, "triggerSource": "diary"})",
+                    R"(1 {"resultNumberOfBundleEvents": 0, "stateDatabaseAvailable": true, )"
+                    R"("triggerSource": "diary"})",
+                    R"(4 {"resultNumberOfBundleEvents": 0, "resultNumberOfEvents": 0, )"
+                    R"("stateDatabaseAvailable": true, "triggerSource": "diary"})",
+                    R"(5 {"resultOverallSuccess": false, "triggerSource": "diary"})"));
+}
+
+TEST_F(Client, AMissingReplyOrNameIsFine) {
+    const auto nobody = KSConduitContext();
+    client().storeEvents({}, nobody, nullptr);
+    client().fetchEventsWithOptions({}, nobody, nullptr);
+    client().purgeEvents(nobody, nullptr);
+    client().analyzeTrendsInEvents({}, nobody, nullptr);
+    client().fetchPhotoAnalyticsMetrics(nobody, nullptr);
+    WorkerThreads::shared().settle();
+    EXPECT_EQ(takeHeard().size(), 2u);
+}
+
+TEST_F(Client, FailuresAreToldToCallerAndListeners) {
+    execute("DROP TABLE KSEventBundleMember; DROP TABLE KSEventBundleMO");
+    const auto context = callingAs("diary");
+    EXPECT_EQ(errorOf([&](auto reply) { client().purgeEvents(context, reply); }),
+              "database: no such table: KSEventBundleMO");
+    EXPECT_THAT(takeHeard(),
+                ElementsAre(R"(4 {"resultNumberOfEvents": 0, "resultOverallSuccess": false, )"
+                            R"("stateDatabaseAvailable": true, "triggerSource": "diary"})"))
+        << "both clean-ups' results are in it, and one of them failed";
+    execute("DROP TABLE KSEventMO");
+    client().fetchEventsWithOptions({}, context,
+                                    [](const KSEventArray& events, const OptionalError& error) {
+                                        EXPECT_TRUE(events.empty());
+                                        EXPECT_TRUE(error);
+                                    });
+    EXPECT_THAT(takeHeard(),
+                ElementsAre(R"(0 {"resultOverallSuccess": false, "triggerSource": "diary"})"));
+}
+
+TEST_F(Client, PhotoMetricsHaveAVersionAndASeedInRange) {
+    std::set<std::int64_t> seeds;
+    for (int call = 0; call < 500; ++call) {
+        client().fetchPhotoAnalyticsMetrics(
+            {}, [&seeds](const KSDictionary& metrics, const OptionalError& error) {
+                EXPECT_FALSE(error);
+                EXPECT_EQ(*valueForKey(metrics, "version").asString(), "1.0.1");
+                seeds.insert(*valueForKey(metrics, "seed").asInteger());
+            });
+    }
+    EXPECT_GE(*seeds.begin(), 0);
+    EXPECT_LE(*seeds.rbegin(), 73);
+    EXPECT_GT(seeds.size(), 20u);
+}
+
+TEST_F(Client, StatusCountsAndNamesProblems) {
+    storeAll({makeWorkout(1, 1, 2, "Running")});
+    manager->persistCollectionDate();
+    platform.problems.add("older");
+    platform.problems.add("newer");
+    platform.deviceData.report = {true, 12, 3, {"a file"}};
+    StatusReporter reporter(platform.services, manager);
+    DaemonStatus status;
+    reporter.status([&status](DaemonStatus answer) { status = std::move(answer); });
+    WorkerThreads::shared().settle();
+    EXPECT_TRUE(status.databaseAvailable);
+    EXPECT_EQ(status.eventCount, 1u);
+    EXPECT_EQ(status.filesIndexed, 12u);
+    EXPECT_EQ(status.filesRefused, 3u);
+    EXPECT_EQ(status.lastCollection, platform.clock.now().seconds);
+    EXPECT_THAT(status.problems, ElementsAre("newer", "older", "a file"));
+}
+
+TEST_F(Client, TheServerNeedsItsManagers) {
+    TestUniverse empty(platform.services);
+    RecordedAssertions assertions;
+    EXPECT_EQ(KSManageServer::initWithUniverse(empty), nullptr);
+    EXPECT_THAT(assertions.takeDescriptions(),
+                ElementsAre("Invalid parameter not satisfying: eventManager"));
+}
+
+}  // namespace
+}  // namespace keepsakes
