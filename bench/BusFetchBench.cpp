@@ -52,7 +52,8 @@ KSEventArray makeEvents() {
             event->placeName = fmt::format("Some place {}", number);
             event->location = KSLocation{48.1 + 1e-5 * number, 11.5};
             event->workoutType = "hiking";
-            event->scoredTopics = KSDictionary{{"outdoors", 0.7}, {"sport", 0.3}};
+            if (number % 10 == 0)
+                event->scoredTopics = KSDictionary{{"outdoors", 0.7}, {"sport", 0.3}};
         }
         events.push_back(std::move(event));
     }

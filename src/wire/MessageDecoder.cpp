@@ -7,7 +7,6 @@
 #include <cerrno>
 #include <cmath>
 #include <cstring>
-#include <limits>
 
 #include "core/Json.h"
 #include "wire/BusNames.h"
@@ -168,7 +167,8 @@ bool MessageDecoder::readBool(bool& value) {
     return true;
 }
 
-bool MessageDecoder::integer(KSValue& value) {
+// An unsigned one beyond the signed range comes out wrapped.
+bool MessageDecoder::integer(std::int64_t& value) {
     alignas(8) unsigned char storage[8] = {};
     const char type = type_[0];
     if (!basic(type, storage)) return false;
@@ -198,10 +198,10 @@ bool MessageDecoder::readUnsigned(std::uint64_t& value) {
     if (!open("t")) return false;
     if (type_.size() != 1 || !kIntegers.contains(type_[0])) return fail("not an integer");
     const bool isSigned = !is("t");
-    KSValue read;
+    std::int64_t read = 0;
     if (!integer(read)) return false;
-    if (isSigned && *read.asInteger() < 0) return fail("negative, where a count or code belongs");
-    value = static_cast<std::uint64_t>(*read.asInteger());
+    if (isSigned && read < 0) return fail("negative, where a count or code belongs");
+    value = static_cast<std::uint64_t>(read);
     return true;
 }
 
@@ -209,9 +209,8 @@ bool MessageDecoder::number(char type, double& value) {
     if (type == 'd') return basic('d', &value);
     const auto outer = type_;
     type_ = std::string_view(&kIntegers[kIntegers.find(type)], 1);
-    KSValue read;
-    if (!integer(read)) return false;
-    const auto whole = *read.asInteger();
+    std::int64_t whole = 0;
+    if (!integer(whole)) return false;
     value = type == 't' ? static_cast<double>(static_cast<std::uint64_t>(whole))
                         : static_cast<double>(whole);
     type_ = outer;
@@ -333,6 +332,16 @@ bool MessageDecoder::array(KSValue& value, std::size_t depth) {
     return true;
 }
 
+bool MessageDecoder::whole(KSValue& value) {
+    if (!kIntegers.contains(type_[0])) return fail("of a kind without meaning");
+    std::int64_t read = 0;
+    if (!integer(read)) return false;
+    const bool tooLarge = is("t") && read < 0;
+    value =
+        tooLarge ? KSValue(static_cast<double>(static_cast<std::uint64_t>(read))) : KSValue(read);
+    return true;
+}
+
 bool MessageDecoder::value(KSValue& value, std::size_t depth) {
     if (!open() || !spend(kValueCost)) return false;
     switch (type_[0]) {
@@ -346,16 +355,6 @@ bool MessageDecoder::value(KSValue& value, std::size_t depth) {
             double read = 0;
             if (!basic('d', &read)) return false;
             value = read;
-            return true;
-        }
-        case 't': {
-            std::uint64_t read = 0;
-            if (!basic('t', &read)) return false;
-            if (read > std::numeric_limits<std::int64_t>::max()) {
-                value = static_cast<double>(read);
-            } else {
-                value = read;
-            }
             return true;
         }
         case 's':
@@ -387,8 +386,7 @@ bool MessageDecoder::value(KSValue& value, std::size_t depth) {
             return true;
         }
         default:
-            return kIntegers.contains(type_[0]) ? integer(value)
-                                                : fail("of a kind without meaning");
+            return whole(value);
     }
 }
 

@@ -78,7 +78,8 @@ class MessageDecoder final : public KeyedDecoder {
     bool pair(double& first, double& second);
     bool value(KSValue& value, std::size_t depth);
     bool array(KSValue& value, std::size_t depth);
-    bool integer(KSValue& value);
+    bool integer(std::int64_t& value);
+    bool whole(KSValue& value);
     bool dictionary(KSDictionary& value, std::size_t depth);
     /// Reads the entries of the dictionary that this stands on: `read(key)` for each, standing on
     /// the value.
