@@ -11,6 +11,7 @@
 #include <fstream>
 #include <functional>
 
+#include "Bench.h"
 #include "indexer/FolderScan.h"
 #include "indexer/OccasionUpdate.h"
 
@@ -92,15 +93,14 @@ int main() {
     };
     const long before = peakKilobytes();
     const double first = milliseconds(scan);
-    fmt::print("first scan of {} tiny files: {:.0f} ms, {} bytes of memory a file\n",
-               reporter.summary.read, first, (peakKilobytes() - before) * 1024 / kFiles);
+    fmt::print("first scan of {} tiny files, {} bytes of memory a file|{:.0f} ms|-|-|-\n",
+               reporter.summary.read, (peakKilobytes() - before) * 1024 / kFiles, first);
     const double rescan = best(15, scan);
     struct stat info {};
     const double stats = best(15, [&] {
         for (const auto& path : paths) (void)!::stat(path.c_str(), &info);
     });
-    fmt::print("rescan {:.2f} ms, stat {:.2f} ms: ratio {:.2f} (limit 3), {} read\n", rescan, stats,
-               rescan / stats, reporter.summary.read);
+    bench::report("rescan 10,000 unchanged files / stat of the same", rescan, stats, 3);
 
     IndexWriter writer(root / "photos.sqlite");
     FileRecords one;
@@ -121,8 +121,9 @@ int main() {
         updateOccasions(writer);
         writer.commit({0});
     };
-    fmt::print("occasions of 100,000 photos: {:.0f} ms the first time, ", milliseconds(update));
-    fmt::print("{:.0f} ms again (limit 1000), {} occasions\n", best(3, update),
-               writer.totals().occasions);
+    constexpr double kMostMilliseconds = 1000;
+    fmt::print("occasions of 100,000 photos, the first time|{:.0f} ms|-|-|-\n",
+               milliseconds(update));
+    bench::report("occasions of 100,000 photos, again", best(3, update), kMostMilliseconds, 1);
     fs::remove_all(root);
 }

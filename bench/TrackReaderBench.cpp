@@ -93,14 +93,16 @@ int main() {
     ::close(fd);
     std::filesystem::remove_all(folder);
 
-    const double pace = megabytes / parsed;
-    fmt::print("{:.0f} MB, {} workouts{}{}\n", megabytes, workouts, error.empty() ? "" : ", error ",
-               error);
-    fmt::print("bytes only  {:7.3f} s  {:6.0f} MB/s\n", bytesOnly, megabytes / bytesOnly);
+    if (!error.empty()) fmt::print(stderr, "{}\n", error);
+    const double limit = megabytes / kLeastPace;
     fmt::print(
-        "as a track  {:7.3f} s  {:6.0f} MB/s  {:.1f} x the limit of {:.0f} MB/s, {:.1f} x "
-        "the time of the bytes\n",
-        parsed, pace, pace / kLeastPace, kLeastPace, parsed / bytesOnly);
-    fmt::print("peak memory {} KiB before, {} KiB after\n", before, peakKiB());
+        "read {0:.0f} MB of GPX ({1:.0f} MB/s) / {2:.0f} MB/s|{3:.2f} s|{4:.2f} s|{5:.2f}|1\n",
+        megabytes, megabytes / parsed, kLeastPace, parsed, limit, parsed / limit);
+    fmt::print("read {:.0f} MB of GPX / reading only its bytes|{:.2f} s|{:.3f} s|{:.1f}|-\n",
+               megabytes, parsed, bytesOnly, parsed / bytesOnly);
+    constexpr long kMostGrowthKiB = 16 * 1024;
+    const long growth = peakKiB() - before;
+    fmt::print("memory of reading it|{} KiB|{} KiB|{:.2f}|1\n", growth, kMostGrowthKiB,
+               static_cast<double>(growth) / kMostGrowthKiB);
     return error.empty() && workouts > 0 ? 0 : 1;
 }

@@ -34,12 +34,12 @@ for program in "${programs[@]}"; do
 done
 
 printf '%s' "$lines" | awk -F'|' '
-    BEGIN { printf "%-44s %16s %16s %8s %8s\n", "what", "measured", "limit", "ratio", "allowed" }
+    BEGIN { printf "%-64s %16s %16s %8s %8s\n", "what", "measured", "limit", "ratio", "allowed" }
     NF == 0 { next }
     NF != 5 { print "not a benchmark line: " $0; bad = 1; next }
     # A row without an allowed ratio ("-") is shown for information.
     { over = ($5 != "-" && $4 + 0 > $5 + 0)
       if (over) bad = 1
-      printf "%-44s %16s %16s %8s %8s%s\n", $1, $2, $3, $4, $5, over ? "  too slow" : "" }
+      printf "%-64s %16s %16s %8s %8s%s\n", $1, $2, $3, $4, $5, over ? "  too slow" : "" }
     END { exit bad }' || failed=1
 exit "$failed"

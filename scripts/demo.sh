@@ -37,6 +37,16 @@ newest_record() {
                             UNION ALL SELECT max(end) FROM occasions)"
 }
 
+# records_by_week INDEX: "2024, week 24: 5 2" for the eight newest weeks with records.
+records_by_week() {
+    sqlite3 -readonly "$1" "
+        SELECT strftime('  %Y, week %W: ', end + 978307200, 'unixepoch', 'localtime')
+               || sum(workout) || ' ' || sum(NOT workout)
+        FROM (SELECT end, 1 AS workout FROM workouts UNION ALL SELECT end, 0 FROM occasions)
+        GROUP BY strftime('%Y %W', end + 978307200, 'unixepoch', 'localtime')
+        ORDER BY max(end) DESC LIMIT 8"
+}
+
 if [ "$stage" = start ]; then
     scripts/install-dependencies.sh build test
     build release
@@ -71,6 +81,9 @@ if [ "$stage" = start ]; then
                  "nothing to suggest. The lines above say which files were passed over and why."
             exit 1
         fi
+        echo
+        echo "By week, the newest first (workouts, photo occasions):"
+        records_by_week "$home/look.sqlite"
         # Midnight after the Sunday that ends the week of the newest record.
         unix=$((${newest%.*} + 978307200))
         weekday=$(date -d "@$unix" +%u)
@@ -146,10 +159,10 @@ bundles=$(count bundles)
 stop || exit 1
 
 echo
-echo "$events events and $bundles bundles."
+echo "In that week: events: $events, bundles: $bundles."
 if [ "$#" -gt 0 ]; then
     cat <<EOF
-What limits this: this run looks at the week before $now only;
+Why not more: this run looks at the week before $now only (all weeks stand above);
 files that cannot be read, or that carry no time, are passed over (status names them above);
 a bundle needs events that overlap in time, such as photos taken during a recorded walk.
 EOF

@@ -88,6 +88,19 @@ constexpr auto kSubjects = std::to_array<Phrase>({
     {"nature", "nature"},
 });
 
+/// What photos are said to show in a rule's sentence, when they show several things.
+constexpr auto kRuleSubjects = std::to_array<Phrase>({
+    {"BirthdayPhotos", "birthday"},
+    {"AnniversaryPhotos", "anniversary"},
+    {"VisitPlusConcert", "concert"},
+    {"VisitPlusAmusementPark", "amusementpark"},
+    {"ActivePetParent", "pet"},
+    {"PetParent", "pet"},
+    {"ActiveBabyParent", "baby"},
+    {"BabyParent", "baby"},
+    {"HikingPlusPhotos", "mountain"},
+});
+
 constexpr std::string_view kDay = "EEEE";
 constexpr std::string_view kTime = "HH:mm";
 
@@ -189,6 +202,19 @@ struct PhotoFacts {
     std::vector<std::string> people;
 };
 
+/// The preferred word's text where the photos have it, or else the first of the table that they
+/// have.
+std::string_view subjectOf(const std::vector<std::string>& inferences, std::string_view preferred) {
+    const auto shown = [&inferences](std::string_view word) {
+        return std::ranges::find(inferences, word) != inferences.end();
+    };
+    if (shown(preferred)) return phraseOf(kSubjects, preferred);
+    for (const auto& subject : kSubjects) {
+        if (shown(subject.key)) return subject.text;
+    }
+    return {};
+}
+
 PhotoFacts photoFacts(const KSEventBundle& bundle) {
     PhotoFacts facts;
     std::vector<std::string> inferences;
@@ -205,11 +231,7 @@ PhotoFacts photoFacts(const KSEventBundle& bundle) {
             addDistinct(facts.people, person.name);
         }
     }
-    for (const auto& subject : kSubjects) {
-        if (std::ranges::find(inferences, subject.key) == inferences.end()) continue;
-        facts.subject = subject.text;
-        break;
-    }
+    facts.subject = subjectOf(inferences, phraseOf(kRuleSubjects, bundle.bundleType));
     return facts;
 }
 

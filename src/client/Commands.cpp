@@ -47,6 +47,16 @@ std::string detailsOf(const KSEvent& event) {
     add(event.mediaTitle);
     add(event.mediaArtist);
     add(event.itemDisplayName ? event.itemDisplayName : event.itemLinkTitle);
+    if (const auto& photos = event.extendedAttributes) {
+        for (const auto& word :
+             photos->photoKeepsakeInferences.value_or(std::vector<std::string>())) {
+            add(word);
+        }
+        for (const auto& person : photos->photoKeepsakePersons.value_or(std::vector<KSPerson>())) {
+            add(person.name);
+        }
+        return details;
+    }
     if (details.empty() && event.location) {
         details =
             fmt::format("{:.5f}, {:.5f}", event.location->latitude, event.location->longitude);
@@ -65,7 +75,7 @@ std::string eventTable(const KSEventArray& events, const Screen& screen, std::si
 }
 
 std::string counted(std::size_t count, std::string_view what) {
-    return fmt::format("{} {}{}\n", count, what, count == 1 ? "" : "s");
+    return fmt::format("{} {}{}", count, what, count == 1 ? "" : "s");
 }
 
 /// Fills what both kinds of options share; the text of a usage error, or none.
@@ -115,8 +125,8 @@ std::string statusText(const DaemonStatus& status, const Screen& screen) {
     text += fmt::format("  Activities       collection {}, compute {}, purge {}\n",
                         onOff(status.collectEnabled), onOff(status.computeEnabled),
                         onOff(status.purgeEnabled));
-    text += fmt::format("  Stored           {} events, {} bundles\n", status.eventCount,
-                        status.bundleCount);
+    text += fmt::format("  Stored           {}, {}\n", counted(status.eventCount, "event"),
+                        counted(status.bundleCount, "bundle"));
     text += fmt::format("  Files            {} indexed, {} refused\n", status.filesIndexed,
                         status.filesRefused);
     if (status.problems.empty()) return text + "  Problems         none\n";
@@ -169,7 +179,7 @@ int showEvents(const Console& console, const FetchWords& words) {
     if (!events) return console.fail(events.error());
     if (console.json()) return console.print(jsonRecords(*events));
     const auto table = events->empty() ? "" : eventTable(*events, console.screen());
-    return console.print(table + counted(events->size(), "event"));
+    return console.print(table + counted(events->size(), "event") + "\n");
 }
 
 int showBundles(const Console& console, const FetchWords& words) {
@@ -183,7 +193,7 @@ int showBundles(const Console& console, const FetchWords& words) {
     if (console.json()) return console.print(jsonRecords(*bundles));
     std::string text;
     for (const auto& bundle : *bundles) text += bundleText(*bundle, console.screen()) + "\n";
-    return console.print(text + counted(bundles->size(), "bundle"));
+    return console.print(text + counted(bundles->size(), "bundle") + "\n");
 }
 
 int showTrends(const Console& console, const std::string& file) {
@@ -215,7 +225,7 @@ int showTrends(const Console& console, const std::string& file) {
                    found.value_or("")});
     }
     return console.print((trends->empty() ? "" : table.text(console.screen())) +
-                         counted(trends->size(), "event"));
+                         counted(trends->size(), "event") + "\n");
 }
 
 int doWork(const Console& console, Work work) {

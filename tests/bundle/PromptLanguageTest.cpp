@@ -46,6 +46,10 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
                                            saturday + 22 * 3600, saturday + 25 * 3600)}),
         "A birthday: Saturday 22:00 to Sunday 01:00, 3 photos of a birthday, with Anna, Ben, "
         "Cleo and 2 others");
+    const auto both = photosOf(2, {"baby", "pet"}, {}, start, start);
+    EXPECT_EQ(prompt("PetParent", {both}), "Time with a pet: Saturday 10:02, 2 photos of a pet");
+    EXPECT_EQ(prompt("BabyParent", {both}),
+              "Time with the baby: Saturday 10:02, 2 photos of a baby");
     EXPECT_EQ(prompt("", {makeVisit(1, start.seconds, start.seconds, "Museum")}),
               "A visit: Museum, Saturday 10:02");
     EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
