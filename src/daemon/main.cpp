@@ -89,6 +89,11 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     auto clock = clockStartingAt(arguments.now);
     if (!clock) return refuse(fmt::format("--now: \"{}\" is not an ISO 8601 time", arguments.now));
 
+    if (configuration->device.contentProtection) {
+        logWarning("content_protection: this version does not see the session's lock; the database "
+                   "opens at once");
+    }
+
     auto listener = BusListener::claim();
     if (!listener) return refuse(listener.error().description());
     (*listener)->setDisconnectedHandler([&mainLoop] {
