@@ -14,6 +14,7 @@
 #include "core/KSAssertion.h"
 #include "core/ResultKeys.h"
 #include "platform/PlatformServices.h"
+#include "store/Availability.h"
 #include "store/KSPersistenceManager.h"
 
 namespace keepsakes {
@@ -43,13 +44,6 @@ KSEventBundleArray valuesOf(const KSEventBundler::Bundles& bundles) {
     return values;
 }
 
-ResultHandler addingAvailability(ResultHandler handler) {
-    return [handler = std::move(handler)](OptionalError error, KSDictionary result) {
-        result.insert_or_assign(std::string(kStateDatabaseAvailable), true);
-        handler(std::move(error), std::move(result));
-    };
-}
-
 }  // namespace
 
 KSEventBundleManager::KSEventBundleManager(Clock& clock,
@@ -71,21 +65,10 @@ std::shared_ptr<KSEventBundleManager> KSEventBundleManager::initWithUniverse(
         new KSEventBundleManager(*universe.platform().clock, std::move(store), std::move(manager)));
 }
 
-void KSEventBundleManager::whenAvailable(Work work, const ResultHandler& unavailable) {
-    eventBundleStore_->persistenceManager()->checkAvailabilityWithCompletionHandler(
-        [&](bool available, const OptionalError&) {
-            if (available) {
-                queue_.async(std::move(work));
-            } else {
-                unavailable(databaseUnavailableError(),
-                            {{std::string(kStateDatabaseAvailable), false}});
-            }
-        });
-}
-
 void KSEventBundleManager::bundleEventsWithHandler(ResultHandler handler) {
-    whenAvailable([this, handler = addingAvailability(handler)] { _bundleEvents(handler); },
-                  handler);
+    whenAvailable(
+        *eventBundleStore_->persistenceManager(), queue_,
+        [this, handler = addingAvailability(handler)] { _bundleEvents(handler); }, handler);
 }
 
 void KSEventBundleManager::_bundleEvents(const ResultHandler& handler) {
@@ -215,10 +198,12 @@ void KSEventBundleManager::saveEventBundles(const KSEventBundleArray& bundles, K
 
 void KSEventBundleManager::fetchEventBundlesWithOptions(KSEventBundleFetchOptions options,
                                                         BundlesHandler handler) {
-    whenAvailable([this, options, handler] { _fetchEventBundlesWithOptions(options, handler); },
-                  [&handler](OptionalError error, KSDictionary result) {
-                      handler({}, std::move(error), std::move(result));
-                  });
+    whenAvailable(
+        *eventBundleStore_->persistenceManager(), queue_,
+        [this, options, handler] { _fetchEventBundlesWithOptions(options, handler); },
+        [&handler](OptionalError error, KSDictionary result) {
+            handler({}, std::move(error), std::move(result));
+        });
 }
 
 void KSEventBundleManager::_fetchEventBundlesWithOptions(const KSEventBundleFetchOptions& options,
@@ -276,9 +261,12 @@ KSEventArray KSEventBundleManager::findRehydrateEvents(
 }
 
 void KSEventBundleManager::cleanUpEventBundlesWithHandler(ResultHandler handler) {
-    whenAvailable([this, handler = addingAvailability(
-                             handler)] { eventBundleStore_->purgeExpiredEventBundles(handler); },
-                  handler);
+    whenAvailable(
+        *eventBundleStore_->persistenceManager(), queue_,
+        [this, handler = addingAvailability(handler)] {
+            eventBundleStore_->purgeExpiredEventBundles(handler);
+        },
+        handler);
 }
 
 }  // namespace keepsakes

@@ -58,8 +58,6 @@ class KSEventBundleManager final : public KSService {
     KSEventBundleManager(Clock& clock, std::shared_ptr<KSEventBundleStore> eventBundleStore,
                          std::shared_ptr<KSEventManager> eventManager);
 
-    using Work = std::function<void()>;
-    void whenAvailable(Work work, const ResultHandler& unavailable);
     void _bundleEvents(const ResultHandler& handler);
     void bundleFetchedEvents(const KSEventArray& events, KSDate now, bool collectedRecently,
                              const ResultHandler& handler);

@@ -16,6 +16,7 @@
 #include "model/KSExtensions.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/PlatformServices.h"
+#include "store/Availability.h"
 #include "store/KSDefaultsManager.h"
 #include "store/KSEventStore.h"
 #include "store/KSPersistenceManager.h"
@@ -62,14 +63,6 @@ class Tally {
     OptionalError lastError_;
 };
 
-/// The handler's result with the database's state added.
-ResultHandler addingAvailability(ResultHandler handler) {
-    return [handler = std::move(handler)](OptionalError error, KSDictionary result) {
-        result.insert_or_assign(std::string(kStateDatabaseAvailable), true);
-        handler(std::move(error), std::move(result));
-    };
-}
-
 KSEventArray sortedAs(KSEventArray events, bool ascending) {
     std::ranges::stable_sort(events, [ascending](const auto& a, const auto& b) {
         return ascending ? a->startDate() < b->startDate() : b->startDate() < a->startDate();
@@ -112,18 +105,6 @@ void KSEventManager::setProgressObserver(ProgressObserver observer) {
     refreshQueue_.sync([this, &observer] { progressObserver_ = std::move(observer); });
 }
 
-void KSEventManager::whenAvailable(Work work, const ResultHandler& unavailable) {
-    persistenceManager()->checkAvailabilityWithCompletionHandler(
-        [&](bool available, const OptionalError&) {
-            if (available) {
-                queue_.async(std::move(work));
-            } else {
-                unavailable(databaseUnavailableError(),
-                            {{std::string(kStateDatabaseAvailable), false}});
-            }
-        });
-}
-
 void KSEventManager::afterRefresh(std::string_view activity, Work work) {
     // Not on the manager's queue: fetches are answered while a long scan runs.
     refreshQueue_.async([this, activity = std::string(activity), work = std::move(work)] {
@@ -136,6 +117,7 @@ void KSEventManager::afterRefresh(std::string_view activity, Work work) {
 
 void KSEventManager::collectEventsWithHandler(ResultHandler handler) {
     whenAvailable(
+        *persistenceManager(), queue_,
         [this, handler = addingAvailability(handler)] {
             persistenceManager()->persistCollectionDate();
             afterRefresh("collect", [this, handler] { _collectEvents(handler); });
@@ -184,12 +166,14 @@ void KSEventManager::_collectEventsBetweenStartDate(KSDate start, KSDate end,
 
 void KSEventManager::storeEvents(KSEventArray events, ResultHandler handler) {
     whenAvailable(
+        *persistenceManager(), queue_,
         [this, events = std::move(events), handler] { eventStore_->storeEvents(events, handler); },
         handler);
 }
 
 void KSEventManager::fetchEventsWithOptions(KSEventFetchOptions options, EventsHandler handler) {
     whenAvailable(
+        *persistenceManager(), queue_,
         [this, options, handler] { _fetchEventsWithOptions(options, handler); },
         [&handler](const OptionalError& error, const KSDictionary&) { handler({}, error); });
 }
@@ -246,6 +230,7 @@ void KSEventManager::_rehydrateEvents(const KSEventArray& events, EventsHandler 
 
 void KSEventManager::cleanUpEventsWithHandler(ResultHandler handler) {
     whenAvailable(
+        *persistenceManager(), queue_,
         [this, handler = addingAvailability(handler)] {
             afterRefresh("purge", [this, handler] { _cleanUpEvents(handler); });
         },
@@ -290,11 +275,14 @@ void KSEventManager::_purgeEventsDeletedAtSources(ResultHandler handler) {
 }
 
 void KSEventManager::clearEventsWithHandler(ResultHandler handler) {
-    whenAvailable([this, handler] { eventStore_->removeAllEvents(handler); }, handler);
+    whenAvailable(
+        *persistenceManager(), queue_, [this, handler] { eventStore_->removeAllEvents(handler); },
+        handler);
 }
 
 void KSEventManager::runAnalyticsWithHandler(ResultHandler handler) {
     whenAvailable(
+        *persistenceManager(), queue_,
         [handler] {
             handler(KSError::make(KSErrorCode::analyticsPlansUnavailable,
                                   "Analytics Plans are not avaialble"),

@@ -70,7 +70,6 @@ class KSEventManager final : public KSService {
                    std::shared_ptr<KSEventStore> eventStore, std::unique_ptr<EventSources> sources);
 
     using Work = std::function<void()>;
-    void whenAvailable(Work work, const ResultHandler& unavailable);
     void afterRefresh(std::string_view activity, Work work);
     void _fetchEventsWithOptions(const KSEventFetchOptions& options, const EventsHandler& handler);
     void _collectEvents(const ResultHandler& handler);

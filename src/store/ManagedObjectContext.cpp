@@ -113,14 +113,13 @@ OptionalError ManagedObjectContext::setAside(std::string_view reason) {
 
 SQLite::Statement& ManagedObjectContext::statement(const std::string& sql) {
     if (!database_) throw SQLite::Exception("the database is closed", SQLITE_CANTOPEN);
-    auto& prepared = statements_[sql];
-    if (prepared) {
-        prepared->tryReset();
-        prepared->clearBindings();
-    } else {
-        prepared = std::make_unique<SQLite::Statement>(*database_, sql);
+    if (const auto known = statements_.find(sql); known != statements_.end()) {
+        known->second->tryReset();
+        known->second->clearBindings();
+        return *known->second;
     }
-    return *prepared;
+    auto prepared = std::make_unique<SQLite::Statement>(*database_, sql);
+    return *statements_.emplace(sql, std::move(prepared)).first->second;
 }
 
 int ManagedObjectContext::changes() const { return database_->getChanges(); }

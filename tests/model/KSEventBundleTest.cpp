@@ -6,6 +6,7 @@
 
 #include "model/ValueCoding.h"
 #include "support/RecordedAssertions.h"
+#include "support/SampleRecords.h"
 #include "support/TestEvents.h"
 
 namespace keepsakes {
@@ -46,7 +47,7 @@ TEST(KSEventBundle, KnowsSameAndSharedEvents) {
 }
 
 TEST(KSEventBundle, ComesBackFromItsArchiveWithoutItsType) {
-    const auto bundle = KSEventBundle::initWithEventSet({makeFullEvent(1)}, true, {1000});
+    const auto bundle = KSEventBundle::initWithEventSet({samples::fullEvent(1)}, true, {1000});
     bundle->bundleType = "TravelEvent";
     bundle->promptLanguage = "A trip";
     auto archive = *archiveOf(*bundle).asDictionary();

@@ -10,6 +10,7 @@
 #include "model/KSExtensions.h"
 #include "model/ValueCoding.h"
 #include "support/RecordedAssertions.h"
+#include "support/SampleRecords.h"
 #include "support/TestEvents.h"
 
 namespace keepsakes {
@@ -63,13 +64,12 @@ TEST(KSEvent, NamesWhatItDoesNotKnow) {
 }
 
 TEST(KSEvent, CopiesNarrowlyButSharesWhole) {
-    const auto event = makeFullEvent(1);
+    const auto event = samples::fullEvent(1);
     const auto copy = event->copy();
     EXPECT_TRUE(copy->isEqual(*event));
-    EXPECT_EQ(copy->mode, KSPlaceMode::tourist);
-    EXPECT_EQ(copy->expirationDate, KSDate{9000});
-    EXPECT_EQ(copy->sourceCreationDate(), KSDate{1500});
-    auto bare = makeEvent(1, 1000.25, 2000.5, KSEventProvider::foresight, KSEventCategory::travel);
+    const auto bare = KSEvent::initWithEventIdentifier(event->eventIdentifier(), event->startDate(),
+                                                       event->endDate(), event->creationDate(),
+                                                       event->provider(), event->category());
     bare->mode = event->mode;
     bare->expirationDate = event->expirationDate;
     bare->storedSourceCreationDate = event->storedSourceCreationDate;
@@ -82,7 +82,7 @@ TEST(KSEvent, SourceCreationDateFallsBackToTheEnd) {
 }
 
 TEST(KSEvent, EveryFieldComesBackFromItsArchive) {
-    const auto event = makeFullEvent(1);
+    const auto event = samples::fullEvent(1);
     const KSValue archive = archiveOf(*event);
     ValueDecoder decoder(archive);
     const auto back = KSEvent::initWithCoder(decoder);
@@ -99,7 +99,7 @@ struct BadArchive {
 };
 
 TEST(KSEvent, ArchivesThatCannotBeReadSayWhy) {
-    const auto good = *archiveOf(*makeFullEvent(1)).asDictionary();
+    const auto good = *archiveOf(*samples::fullEvent(1)).asDictionary();
     const BadArchive rows[] = {
         {"eventIdentifier", KSValue(), "eventIdentifier: not a UUID"},
         {"eventIdentifier", "not-a-uuid", "eventIdentifier: not a UUID"},

@@ -10,6 +10,7 @@
 
 #include "StoreFixture.h"
 #include "store/Schema.h"
+#include "support/SampleRecords.h"
 
 namespace keepsakes {
 namespace {
@@ -40,7 +41,7 @@ TEST_F(DatabaseFaults, AFileThatIsNoDatabaseIsSetAsideAndToldOf) {
 
 TEST_F(DatabaseFaults, DamageInsideIsFoundWhenItIsOpened) {
     for (std::uint32_t number = 0; number < 200; ++number) {
-        storeAll({makeFullEvent(number)});
+        storeAll({samples::fullEvent(number)});
     }
     close();
     {
@@ -80,7 +81,8 @@ TEST_F(DatabaseFaults, AFullDiskIsAnErrorAndPassesWhenThereIsRoom) {
     full.rlim_cur = 200 * 1024;
     setrlimit(RLIMIT_FSIZE, &full);
     KSEventArray many;
-    for (std::uint32_t number = 10; number < 3000; ++number) many.push_back(makeFullEvent(number));
+    for (std::uint32_t number = 10; number < 3000; ++number)
+        many.push_back(samples::fullEvent(number));
     const auto refused = storeAll(many);
     setrlimit(RLIMIT_FSIZE, &whole);
     EXPECT_THAT(refused.error, HasSubstr("database: "));

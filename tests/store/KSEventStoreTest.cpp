@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 
 #include "StoreFixture.h"
+#include "support/SampleRecords.h"
 
 namespace keepsakes {
 namespace {
@@ -32,14 +33,14 @@ TEST_F(Store, StoringTheSameIdentifierUpdatesItsRow) {
 }
 
 TEST_F(Store, KeepsWhatItsColumnsHoldAndNothingElse) {
-    const auto event = makeFullEvent(1);
+    const auto event = samples::fullEvent(1);
     event->itemAuthorAddresses = {""};
     event->itemAccountHandles = {std::string("a\0b", 3)};
     storeAll({event});
     open();
     const auto stored = fetch({}).at(0);
 
-    const auto expected = makeFullEvent(1);
+    const auto expected = samples::fullEvent(1);
     expected->location.reset();
     expected->placeUserType = 0;
     expected->placeDiscovery = 0;
@@ -59,9 +60,9 @@ TEST_F(Store, KeepsWhatItsColumnsHoldAndNothingElse) {
     expected->itemAccountHandles = {"a", "b"};
     EXPECT_EQ(archiveOf(*stored).description(), archiveOf(*expected).description());
 
-    storeAll({makeWorkout(2, 5000, 6000, "Running")});
+    storeAll({makeWorkout(2, 900000000, 900000600, "Running")});
     const auto bare = fetch({.ascending = false}).at(0);
-    EXPECT_EQ(bare->sourceCreationDate(), KSDate{6000});
+    EXPECT_EQ(bare->sourceCreationDate(), KSDate{900000600});
     EXPECT_EQ(bare->itemAuthorAddresses, std::nullopt);
 }
 

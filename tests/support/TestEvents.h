@@ -23,9 +23,6 @@ std::shared_ptr<KSEvent> makePhotos(std::uint32_t number, double start, double e
 std::shared_ptr<KSEvent> makeVisit(std::uint32_t number, double start, double end,
                                    std::string placeName);
 
-/// Every field filled with a value of its own.
-std::shared_ptr<KSEvent> makeFullEvent(std::uint32_t number);
-
 /// The record as a dictionary of its coding keys, for whole comparisons that print well.
 template <class Record>
 KSValue archiveOf(const Record& record);

@@ -220,6 +220,7 @@ TEST_F(MalformedCallsTest, ASenderWhoIsGoneIsServedAllTheSame) {
     conduit_.waitForCalls(2);
     EXPECT_EQ(caller_.call("org.freedesktop.DBus.Peer", "Ping", nullptr), "");
     EXPECT_THAT(conduit_.calls(), ElementsAre("storeEvents", "purgeEvents"));
+    conduit_.settle();
     EXPECT_EQ(conduit_.events().size(), 2u);
 }
 
