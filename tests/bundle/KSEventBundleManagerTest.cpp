@@ -3,12 +3,7 @@
 
 #include <gmock/gmock.h>
 
-#include "StoreFixture.h"
-#include "bundle/KSEventBundleStore.h"
-#include "collect/KSEventManager.h"
-#include "sources/KSPhotoManager.h"
-#include "sources/KSVitalsManager.h"
-#include "store/KSDefaultsManager.h"
+#include "ManagersFixture.h"
 
 namespace keepsakes {
 namespace {
@@ -19,19 +14,8 @@ using testing::UnorderedElementsAre;
 
 constexpr double kDay = 86400;
 
-class Bundles : public StoreFixture {
+class Bundles : public ManagersFixture {
   protected:
-    Bundles() {
-        universe->add("EventStore", store);
-        universe->add("EventBundleStore", KSEventBundleStore::initWithUniverse(*universe));
-        universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
-        universe->add("PhotoManager", KSPhotoManager::initWithUniverse(*universe));
-        universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
-        universe->add("EventManager", KSEventManager::initWithUniverse(*universe));
-        bundles = KSEventBundleManager::initWithUniverse(*universe);
-        bundleStore = universe->service<KSEventBundleStore>("EventBundleStore");
-    }
-
     KSDate now() const { return platform.clock.now(); }
 
     std::string run() {
@@ -74,9 +58,6 @@ class Bundles : public StoreFixture {
         platform.photos.keepsakes = {{"keepsake2", {{start + 60}, {start + 120}}, {"mountain"}, 5},
                                      {"keepsake3", {{start + 300}, {start + 400}}, {}, 2}};
     }
-
-    std::shared_ptr<KSEventBundleManager> bundles;
-    std::shared_ptr<KSEventBundleStore> bundleStore;
 };
 
 TEST_F(Bundles, APassStoresRuleAndClusterBundlesAndReplacesThemTheNextTime) {

@@ -59,7 +59,7 @@ class PlantedReader final : public TextReader {
 int main(int argc, char** argv) {
     std::vector<char*> words(argv, argv + argc);
     std::string option = "--seconds-per-file";
-    std::string seconds = "1";
+    std::string seconds = "3";
     words.push_back(option.data());
     words.push_back(seconds.data());
     keepsakes::PlantedReader reader;

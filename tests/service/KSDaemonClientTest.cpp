@@ -5,18 +5,12 @@
 
 #include <set>
 
-#include "StoreFixture.h"
-#include "bundle/KSEventBundleManager.h"
-#include "bundle/KSEventBundleStore.h"
-#include "collect/KSEventManager.h"
+#include "ManagersFixture.h"
 #include "model/ValueCoding.h"
 #include "notify/KSDaemonSPINotifier.h"
 #include "notify/KSDispatcher.h"
 #include "service/KSManageServer.h"
 #include "service/StatusReporter.h"
-#include "sources/KSPhotoManager.h"
-#include "sources/KSVitalsManager.h"
-#include "store/KSDefaultsManager.h"
 #include "support/RecordedAssertions.h"
 
 namespace keepsakes {
@@ -24,16 +18,9 @@ namespace {
 
 using testing::ElementsAre;
 
-class Client : public StoreFixture {
+class Client : public ManagersFixture {
   protected:
     Client() {
-        universe->add("EventStore", store);
-        universe->add("EventBundleStore", KSEventBundleStore::initWithUniverse(*universe));
-        universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
-        universe->add("PhotoManager", KSPhotoManager::initWithUniverse(*universe));
-        universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
-        universe->add("EventManager", KSEventManager::initWithUniverse(*universe));
-        universe->add("EventBundleManager", KSEventBundleManager::initWithUniverse(*universe));
         server = KSManageServer::initWithUniverse(*universe);
         listener = KSDispatcher::initWithNotifier(server->getNotifier());
         for (std::int32_t identifier = 0; identifier <= 5; ++identifier) {
