@@ -32,7 +32,8 @@ KSPersistenceManager::KSPersistenceManager(const PlatformServices& platform)
       queue_("KSPersistenceManager") {}
 
 KSPersistenceManager::~KSPersistenceManager() {
-    dispatcher_->invalidate();
+    // On the queue, where the listening may be ending by itself.
+    queue_.sync([this] { dispatcher_->invalidate(); });
     contextQueue_.sync([this] { managedObjectContext_.reset(); });
 }
 
