@@ -19,7 +19,8 @@ namespace {
 
 constexpr std::uint64_t kMinutes = 60 * std::uint64_t{1000000};
 constexpr std::uint64_t kAnswerTimeout = 10 * kMinutes;
-constexpr std::uint64_t kWorkTimeout = 6 * 60 * kMinutes;
+constexpr std::uint64_t kHours = 60 * kMinutes;
+constexpr std::uint64_t kWorkTimeout = 6 * kHours;
 
 KSError busError(std::string_view name, std::string_view text) {
     auto error = KSError::make(kBusErrorDomain, 0, text);

@@ -18,7 +18,7 @@
 
 namespace keepsakes {
 
-MainLoop::MainLoop() : wake_(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
+MainLoop::MainLoop() {
     std::signal(SIGPIPE, SIG_IGN);
     sigset_t ending;
     sigemptyset(&ending);
@@ -26,6 +26,7 @@ MainLoop::MainLoop() : wake_(::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
     sigaddset(&ending, SIGINT);
     pthread_sigmask(SIG_BLOCK, &ending, nullptr);
     signals_ = ::signalfd(-1, &ending, SFD_CLOEXEC | SFD_NONBLOCK);
+    wake_ = ::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
     if (signals_ < 0 || wake_ < 0) {
         throw std::system_error(errno, std::generic_category(), "main loop");
     }
