@@ -208,7 +208,8 @@ void KSEventBundleManager::fetchEventBundlesWithOptions(KSEventBundleFetchOption
 
 void KSEventBundleManager::_fetchEventBundlesWithOptions(const KSEventBundleFetchOptions& options,
                                                          const BundlesHandler& handler) {
-    const auto answer = [handler](KSEventBundleArray bundles, OptionalError error, KSDictionary) {
+    const auto answer = [handler](KSEventBundleArray bundles, OptionalError error,
+                                  const KSDictionary&) {
         KSDictionary result{{std::string(kStateDatabaseAvailable), true},
                             {std::string(kResultNumberOfBundleEvents), bundles.size()}};
         handler(std::move(bundles), std::move(error), std::move(result));

@@ -6,7 +6,7 @@
 #include <array>
 #include <cerrno>
 #include <charconv>
-#include <cstring>
+#include <system_error>
 
 #include "wire/BusHandles.h"
 #include "wire/BusNames.h"
@@ -19,7 +19,8 @@ namespace {
 
 constexpr std::uint64_t kMinutes = 60 * std::uint64_t{1000000};
 constexpr std::uint64_t kAnswerTimeout = 10 * kMinutes;
-constexpr std::uint64_t kWorkTimeout = 6 * 60 * kMinutes;
+constexpr std::uint64_t kHours = 60 * kMinutes;
+constexpr std::uint64_t kWorkTimeout = 6 * kHours;
 
 KSError busError(std::string_view name, std::string_view text) {
     auto error = KSError::make(kBusErrorDomain, 0, text);
@@ -29,7 +30,7 @@ KSError busError(std::string_view name, std::string_view text) {
 
 KSError busError(int result, std::string_view what) {
     return busError(result == -E2BIG ? bus::kLimitsExceeded : "",
-                    fmt::format("{}: {}", what, std::strerror(-result)));
+                    fmt::format("{}: {}", what, std::generic_category().message(-result)));
 }
 
 KSError errorOf(const sd_bus_error& answered) {
@@ -108,9 +109,9 @@ struct ConduitClient::State {
             if (result == -EINTR) result = 0;
         }
         if (!reply) {
-            return std::unexpected(
-                busError(SD_BUS_ERROR_DISCONNECTED,
-                         fmt::format("the session bus is gone: {}", std::strerror(-result))));
+            return std::unexpected(busError(SD_BUS_ERROR_DISCONNECTED,
+                                            fmt::format("the session bus is gone: {}",
+                                                        std::generic_category().message(-result))));
         }
         if (const auto* error = sd_bus_message_get_error(reply.get())) {
             return std::unexpected(errorOf(*error));
@@ -173,8 +174,9 @@ ConduitClient::~ConduitClient() = default;
 ConduitClient::Result<std::unique_ptr<ConduitClient>> ConduitClient::connect() {
     sd_bus* opened = nullptr;
     if (const int result = sd_bus_open_user(&opened); result < 0) {
-        return std::unexpected(busError(SD_BUS_ERROR_NO_SERVER,
-                                        fmt::format("no session bus: {}", std::strerror(-result))));
+        return std::unexpected(
+            busError(SD_BUS_ERROR_NO_SERVER,
+                     fmt::format("no session bus: {}", std::generic_category().message(-result))));
     }
     auto state = std::make_unique<State>();
     state->connection.reset(opened);

@@ -3,11 +3,11 @@
 
 #include <cerrno>
 #include <charconv>
-#include <cstdlib>
 #include <filesystem>
 
 #include "client/Commands.h"
 #include "client/RecordJson.h"
+#include "config/Environment.h"
 #include "core/Files.h"
 #include "core/Json.h"
 #include "core/PropertyList.h"
@@ -18,14 +18,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// `$XDG_CONFIG_HOME/keepsakesd/defaults` (XDG Base Directory Specification).
-fs::path defaultsFolder() {
-    const char* configured = std::getenv("XDG_CONFIG_HOME");
-    if (configured && *configured == '/') return fs::path(configured) / "keepsakesd/defaults";
-    const char* home = std::getenv("HOME");
-    return fs::path(home ? home : "/") / ".config/keepsakesd/defaults";
-}
-
 bool isDomain(std::string_view domain) {
     return !domain.empty() && domain.front() != '.' && !domain.contains('/');
 }
@@ -34,18 +26,24 @@ int refuseDomain(const Console& console, const std::string& domain) {
     return console.usage(fmt::format("\"{}\" is not a domain", domain));
 }
 
-fs::path fileOf(const std::string& domain) { return defaultsFolder() / (domain + ".plist"); }
+fs::path fileOf(const StandardFolders& folders, const std::string& domain) {
+    return folders.defaultsFolder() / (domain + ".plist");
+}
 
 /// A domain without a file has no values.
 std::expected<KSDictionary, KSError> load(const std::string& domain) {
-    auto values = readPropertyListFile(fileOf(domain));
+    const auto folders = StandardFolders::find();
+    if (!folders) return std::unexpected(folders.error());
+    auto values = readPropertyListFile(fileOf(*folders, domain));
     if (!values && values.error().code == ENOENT) return KSDictionary();
     return values;
 }
 
 OptionalError save(const std::string& domain, const KSDictionary& values) {
-    if (auto error = makePrivateFolder(defaultsFolder())) return error;
-    return writePropertyListFile(fileOf(domain), values);
+    const auto folders = StandardFolders::find();
+    if (!folders) return folders.error();
+    if (auto error = makePrivateFolder(folders->defaultsFolder())) return error;
+    return writePropertyListFile(fileOf(*folders, domain), values);
 }
 
 template <class Number>

@@ -9,7 +9,8 @@
 
 #include <algorithm>
 #include <cstdint>
-#include <cstdlib>
+
+#include "config/Environment.h"
 
 namespace keepsakes {
 
@@ -98,9 +99,8 @@ Screen Screen::ofStandardOutput() {
     Screen screen;
     if (!isatty(STDOUT_FILENO)) return screen;
     screen.isTerminal = true;
-    const char* noColour = std::getenv("NO_COLOR");
-    const char* kind = std::getenv("TERM");
-    screen.coloured = !(noColour && *noColour) && kind && std::string_view(kind) != "dumb";
+    const auto environment = processEnvironment();
+    screen.coloured = !environment("NO_COLOR") && environment("TERM").value_or("dumb") != "dumb";
     winsize size{};
     screen.columns =
         ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col : 80;

@@ -73,7 +73,8 @@ class Everything {
     std::expected<Array, KSError> run() {
         if (auto error = take({})) {
             if (!meansTooLarge(*error)) return std::unexpected(*error);
-            if ((error = takeParts())) return std::unexpected(*error);
+            error = takeParts();
+            if (error) return std::unexpected(*error);
         }
         return std::move(found_);
     }

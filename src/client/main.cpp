@@ -144,7 +144,7 @@ class CommandLine {
 }  // namespace keepsakes
 
 int main(int argc, char** argv) {
-    std::setlocale(LC_ALL, "");
+    std::setlocale(LC_ALL, "");  // NOLINT(concurrency-mt-unsafe): no other thread runs yet
     std::signal(SIGPIPE, SIG_IGN);
     return keepsakes::CommandLine().run(argc, argv);
 }

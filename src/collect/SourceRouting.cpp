@@ -19,10 +19,11 @@ EventSources::EventSources(const ServiceLookup& universe)
                           }});
     }
     if (photoManager_) {
-        steps_.push_back({"resultPhotosSuccess",
-                          [source = photoManager_](KSDate start, KSDate end, ResultHandler done) {
-                              source->fetchAndSavePhotoKeepsakesBetweenStartDate(start, end, done);
-                          }});
+        steps_.push_back(
+            {"resultPhotosSuccess",
+             [source = photoManager_](KSDate start, KSDate end, const ResultHandler& done) {
+                 source->fetchAndSavePhotoKeepsakesBetweenStartDate(start, end, done);
+             }});
     }
 }
 

@@ -26,19 +26,19 @@ class KSValue {
     using Dictionary = std::map<std::string, KSValue, std::less<>>;
 
     KSValue() = default;
-    KSValue(bool value) : data_(value) {}  // NOLINT(google-explicit-constructor): literals
+    // Implicit: literals and records become values where they stand.
+    KSValue(bool value) : data_(value) {}
     template <std::integral T>
-    requires(!std::same_as<T, bool>) KSValue(T value)
-        : data_(static_cast<std::int64_t>(value)) {}                // NOLINT: as above
-    KSValue(double value) : data_(value) {}                         // NOLINT: as above
-    KSValue(const char* value) : data_(std::string(value)) {}       // NOLINT: as above
-    KSValue(std::string_view value) : data_(std::string(value)) {}  // NOLINT: as above
-    KSValue(std::string value) : data_(std::move(value)) {}         // NOLINT: as above
-    KSValue(Bytes value) : data_(std::move(value)) {}               // NOLINT: as above
-    KSValue(KSDate value) : data_(value) {}                         // NOLINT: as above
-    KSValue(KSUUID value) : data_(value) {}                         // NOLINT: as above
-    KSValue(Array value) : data_(std::move(value)) {}               // NOLINT: as above
-    KSValue(Dictionary value) : data_(std::move(value)) {}          // NOLINT: as above
+    requires(!std::same_as<T, bool>) KSValue(T value) : data_(static_cast<std::int64_t>(value)) {}
+    KSValue(double value) : data_(value) {}
+    KSValue(const char* value) : data_(std::string(value)) {}
+    KSValue(std::string_view value) : data_(std::string(value)) {}
+    KSValue(std::string value) : data_(std::move(value)) {}
+    KSValue(Bytes value) : data_(std::move(value)) {}
+    KSValue(KSDate value) : data_(value) {}
+    KSValue(KSUUID value) : data_(value) {}
+    KSValue(Array value) : data_(std::move(value)) {}
+    KSValue(Dictionary value) : data_(std::move(value)) {}
 
     bool isNull() const { return std::holds_alternative<std::monostate>(data_); }
     std::optional<bool> asBool() const { return read<bool>(); }

@@ -130,7 +130,7 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
 int main(int argc, char** argv) {
     std::setvbuf(stdout, nullptr, _IOLBF, 0);
     // Each arena keeps what its threads freed; queues move from thread to thread.
-    mallopt(M_ARENA_MAX, 2);
+    mallopt(M_ARENA_MAX, 2);  // NOLINT(concurrency-mt-unsafe): no other thread runs yet
 
     Arguments arguments;
     CLI::App app("Gathers what happened in its owner's life into a local database.", "keepsakesd");

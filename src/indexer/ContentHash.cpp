@@ -13,7 +13,7 @@ namespace keepsakes {
 namespace {
 
 bool hashRange(sha256_ctx& context, int fd, std::int64_t from, std::int64_t to) {
-    std::array<std::uint8_t, 16384> block;
+    std::array<std::uint8_t, 16384> block{};
     while (from < to) {
         const auto wanted = std::min<std::int64_t>(to - from, std::int64_t{block.size()});
         const auto count = ::pread(fd, block.data(), static_cast<std::size_t>(wanted), from);
@@ -29,7 +29,7 @@ bool hashRange(sha256_ctx& context, int fd, std::int64_t from, std::int64_t to) 
 }  // namespace
 
 std::optional<std::string> contentHash(int fd, std::int64_t size) {
-    sha256_ctx context;
+    sha256_ctx context{};
     sha256_init(&context);
     std::array<std::uint8_t, 8> length{};
     for (std::size_t i = 0; i < length.size(); ++i) {

@@ -13,7 +13,7 @@ namespace keepsakes {
 
 std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int fd, int wanted,
                                                                            KSDate now) {
-    std::array<std::byte, kHeadSize> head;
+    std::array<std::byte, kHeadSize> head{};
     std::size_t filled = 0;
     while (filled < head.size()) {
         const auto count =

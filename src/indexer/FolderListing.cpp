@@ -55,8 +55,8 @@ std::expected<FolderListing, int> listFolder(const std::string& path) {
     listing.identity = {info.st_dev, info.st_ino};
     for (;;) {
         errno = 0;
-        // The stream is this function's own.
-        const dirent* entry = ::readdir(folder.get());  // NOLINT(concurrency-mt-unsafe): as above
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): the stream is this function's own
+        const dirent* entry = ::readdir(folder.get());
         if (!entry) {
             if (errno != 0) return std::unexpected(errno);
             break;

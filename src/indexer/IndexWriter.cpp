@@ -14,7 +14,7 @@ namespace keepsakes {
 
 namespace {
 
-const int kOpenFlags = SQLite::OPEN_READWRITE | SQLite::OPEN_CREATE;
+constexpr int kOpenFlags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE;
 
 /// The file's version; nothing when it is no database.
 std::optional<int> versionOf(const std::filesystem::path& path) {

@@ -73,6 +73,7 @@ std::vector<T> byFrequency(const std::map<T, std::size_t>& counts) {
     std::vector<std::pair<T, std::size_t>> entries(counts.begin(), counts.end());
     std::ranges::stable_sort(entries, std::ranges::greater{}, &std::pair<T, std::size_t>::second);
     std::vector<T> values;
+    values.reserve(entries.size());
     for (auto& entry : entries) values.push_back(std::move(entry.first));
     return values;
 }
@@ -188,7 +189,7 @@ KSDictionary occasionContent(std::span<const OccasionWords> photos) {
 }
 
 KSUUID identifierOf(std::string_view text) {
-    sha256_ctx context;
+    sha256_ctx context{};
     sha256_init(&context);
     sha256_update(&context, text.size(), reinterpret_cast<const std::uint8_t*>(text.data()));
     KSUUID id;

@@ -152,6 +152,7 @@ class Update {
             if (!rows_[member].words.empty()) merge(words, parseWords(rows_[member].words));
         }
         std::vector<OccasionWords> said;
+        said.reserve(moments.size());
         for (auto& [moment, words] : moments) said.push_back(std::move(words));
         return {.identifier = {},
                 .start = photos_[members.front()].taken.seconds - kOccasionMargin,
@@ -161,7 +162,7 @@ class Update {
     }
 
     template <class T>
-    static void mergeDistinct(std::vector<T>& into, std::vector<T>&& from) {
+    static void mergeDistinct(std::vector<T>& into, std::vector<T> from) {
         for (auto& value : from) {
             if (std::ranges::find(into, value) == into.end()) into.push_back(std::move(value));
         }

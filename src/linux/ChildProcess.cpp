@@ -70,7 +70,8 @@ std::expected<std::shared_ptr<ChildProcess>, KSError> ChildProcess::start(
         return std::unexpected(posixError(code, "make an eventfd for", arguments.front()));
     }
     std::vector<char*> words;
-    // The interface is older than const; it does not write.
+    words.reserve(arguments.size() + 1);
+    // NOLINTNEXTLINE(cppcoreguidelines-pro-type-const-cast): older than const; it does not write
     for (const auto& argument : arguments) words.push_back(const_cast<char*>(argument.c_str()));
     words.push_back(nullptr);
     const SpawnSetup setup(ends[1]);
@@ -171,7 +172,7 @@ bool ChildProcess::reap(ChildEnd& ending) {
 
 /// Whether there may be more.
 bool ChildProcess::readOutput(const std::function<void(std::string_view)>& line) {
-    std::array<char, 16384> block;
+    std::array<char, 16384> block{};
     for (;;) {
         const auto count = ::read(output_, block.data(), block.size());
         if (count < 0) return errno == EAGAIN || errno == EINTR;

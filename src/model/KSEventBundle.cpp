@@ -116,7 +116,7 @@ std::shared_ptr<KSEventBundle> KSEventBundle::initWithCoder(KeyedDecoder& decode
     static const KeyedFieldIndex<Bundle> index{std::span<const KeyedField<Bundle>>(kFields)};
     std::optional<KSUUID> identifier;
     std::optional<KSDate> created;
-    const std::shared_ptr<KSEventBundle> bundle(new KSEventBundle({}, {}));
+    std::shared_ptr<KSEventBundle> bundle(new KSEventBundle({}, {}));
     const bool good = decoder.readRecord([&](std::string_view key, KeyedDecoder& in) {
         if (key == "bundleIdentifier") return coding::read(in, identifier);
         if (key == "creationDate") return coding::read(in, created);

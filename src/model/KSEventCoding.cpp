@@ -188,7 +188,7 @@ std::shared_ptr<KSEvent> KSEvent::initWithCoder(KeyedDecoder& decoder) {
 
     // Fields come in any order, so the details are read into a record whose core is set last.
     Core core;
-    const std::shared_ptr<KSEvent> event(new KSEvent({}, {}, {}, {}, {}, {}));
+    std::shared_ptr<KSEvent> event(new KSEvent({}, {}, {}, {}, {}, {}));
     const bool good = decoder.readRecord([&](std::string_view key, KeyedDecoder& in) {
         if (coreFields.holds(key)) return coreFields.read(key, in, core);
         return detailFields.read(key, in, *event);

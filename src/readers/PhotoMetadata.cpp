@@ -77,9 +77,8 @@ Blocks readHeif(int fd) {
 
 Blocks readBlocks(int fd, std::int64_t size) {
     std::array<std::byte, kHeadSize> head{};
-    const auto count = DescriptorIo(fd, size).read(
-        reinterpret_cast<Exiv2::byte*>(head.data()),  // NOLINT: bytes as the library has them
-        static_cast<long>(head.size()));
+    const auto count = DescriptorIo(fd, size).read(reinterpret_cast<Exiv2::byte*>(head.data()),
+                                                   static_cast<long>(head.size()));
     if (kindOf(std::span(head).first(static_cast<std::size_t>(count))) != FileKind::photo) {
         throw std::runtime_error("neither JPEG nor PNG nor HEIF");
     }

@@ -22,8 +22,9 @@ bool isUtf8(std::string_view text) {
 
 icu::UnicodeString decode(std::string_view bytes) {
     const auto length = static_cast<std::int32_t>(bytes.size());
-    if (isUtf8(bytes)) return icu::UnicodeString::fromUTF8({bytes.data(), length});
-    return icu::UnicodeString(bytes.data(), length, "windows-1252");
+    const char* const start = bytes.data();
+    if (isUtf8(bytes)) return icu::UnicodeString::fromUTF8({start, length});
+    return icu::UnicodeString(start, length, "windows-1252");
 }
 
 bool isAsciiWord(std::string_view text, std::string& folded) {

@@ -4,7 +4,7 @@
 #include <fmt/format.h>
 
 #include <cerrno>
-#include <cstring>
+#include <system_error>
 
 #include "wire/BusLoop.h"
 #include "wire/BusNames.h"
@@ -22,7 +22,8 @@ std::unexpected<KSError> failure(int result, std::string_view what) {
 std::expected<std::unique_ptr<BusListener>, KSError> BusListener::claim() {
     sd_bus* opened = nullptr;
     if (const int result = sd_bus_open_user(&opened); result < 0) {
-        return failure(result, fmt::format("no session bus: {}", std::strerror(-result)));
+        return failure(result,
+                       fmt::format("no session bus: {}", std::generic_category().message(-result)));
     }
     bus::Connection connection(opened);
     if (const int result = sd_bus_request_name(connection.get(), bus::kName, 0); result < 0) {
@@ -31,7 +32,7 @@ std::expected<std::unique_ptr<BusListener>, KSError> BusListener::claim() {
                                                 bus::kName));
         }
         return failure(result, fmt::format("the bus does not give the name {}: {}", bus::kName,
-                                           std::strerror(-result)));
+                                           std::generic_category().message(-result)));
     }
     return std::unique_ptr<BusListener>(
         new BusListener(std::make_unique<BusLoop>(std::move(connection))));

@@ -9,9 +9,9 @@
 #include <atomic>
 #include <cerrno>
 #include <chrono>
-#include <cstring>
 #include <ctime>
 #include <exception>
+#include <system_error>
 
 #include "Introspection.h"
 #include "core/Log.h"
@@ -89,7 +89,8 @@ void BusLoop::run() {
         sd_bus_add_object(connection_.get(), &slot, bus::kPath, &BusLoop::onMessage, this);
     object_.reset(slot);
     if (result < 0) {
-        logError(fmt::format("bus: cannot export {}: {}", bus::kPath, std::strerror(-result)));
+        logError(fmt::format("bus: cannot export {}: {}", bus::kPath,
+                             std::generic_category().message(-result)));
         lost_ = true;
     }
     while (!stopping_ && !lost_) turn();
@@ -313,9 +314,11 @@ void BusLoop::sendBody(sd_bus_message* call, bus::Message message, int status) {
     if (status == -E2BIG || status == -EMSGSIZE) {
         sendError(call, bus::kLimitsExceeded, kTooLarge);
     } else {
-        logWarning(fmt::format("bus: a reply could not be sent: {}", std::strerror(-status)));
+        logWarning(fmt::format("bus: a reply could not be sent: {}",
+                               std::generic_category().message(-status)));
         sendError(call, bus::kFailed,
-                  fmt::format("the reply could not be sent: {}", std::strerror(-status)));
+                  fmt::format("the reply could not be sent: {}",
+                              std::generic_category().message(-status)));
     }
 }
 

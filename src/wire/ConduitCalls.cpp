@@ -46,6 +46,7 @@ Protocol::Reply plainReply(Respond respond) {
 
 template <class Array>
 std::function<void(Array, OptionalError)> recordsReply(Respond respond) {
+    // NOLINTNEXTLINE(performance-unnecessary-value-param): moved from; unseen inside a template
     return [respond = std::move(respond)](Array records, OptionalError error) {
         const auto count = records.size();
         const auto shared = std::make_shared<const Array>(std::move(records));

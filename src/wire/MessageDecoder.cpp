@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cmath>
 #include <cstring>
+#include <system_error>
 
 #include "core/Json.h"
 #include "wire/BusNames.h"
@@ -53,7 +54,8 @@ bool MessageDecoder::fail(std::string_view reason) {
 }
 
 bool MessageDecoder::failMessage(int result) {
-    return fail(fmt::format("the message is broken ({})", std::strerror(-result)));
+    return fail(
+        fmt::format("the message is broken ({})", std::generic_category().message(-result)));
 }
 
 bool MessageDecoder::spend(std::size_t bytes) {

@@ -90,9 +90,9 @@ struct ValueWriter {
     }
     void operator()(const KSArray& value) const {
         if (depth >= bus::kDeepestValue) return out.text(jsonText(value).value_or("[]"));
-        const std::string_view type = TypeOf{}(value);
-        const auto element = type.substr(1);
-        out.open('a', element.data());
+        const char* const elementType = TypeOf{}(value) + 1;
+        const std::string_view element = elementType;
+        out.open('a', elementType);
         for (const auto& item : value) {
             if (element != "v") {
                 item.visit(ValueWriter{out, depth + 1});
@@ -180,7 +180,9 @@ void MessageEncoder::dictionary(const KSDictionary& value, std::size_t depth) {
     open('a', "{sv}");
     for (const auto& [key, item] : value) {
         if (const char* type = typeOf(item, depth)) {
-            entry(key, type, [&] { item.visit(ValueWriter{*this, depth}); });
+            entry(key, type, [this, depth, &present = item] {
+                present.visit(ValueWriter{*this, depth});
+            });
         }
     }
     close();
