@@ -90,8 +90,9 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     if (!clock) return refuse(fmt::format("--now: \"{}\" is not an ISO 8601 time", arguments.now));
 
     if (configuration->device.contentProtection) {
-        logWarning("content_protection: this version does not see the session's lock; the database "
-                   "opens at once");
+        logWarning(
+            "content_protection: this version does not see the session's lock; the database "
+            "opens at once");
     }
 
     auto listener = BusListener::claim();
