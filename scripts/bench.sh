@@ -25,12 +25,11 @@ failed=0
 lines=
 for program in "${programs[@]}"; do
     [ -x "$program" ] || { echo "no such benchmark: $program" >&2; exit 2; }
-    if output=$("$program" </dev/null); then
-        lines+=$output$'\n'
-    else
-        echo "$program failed with status $?" >&2
-        failed=1
-    fi
+    # Assigned first, so that the lines of one that fails are shown as well.
+    status=0
+    output=$("$program" </dev/null) || status=$?
+    lines+=$output$'\n'
+    [ "$status" -eq 0 ] || { echo "$program failed with status $status" >&2; failed=1; }
 done
 
 printf '%s' "$lines" | awk -F'|' '
