@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "core/Problems.h"
+#include "daemon/MemoryRelease.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "linux/AnalyticsLog.h"
@@ -76,7 +77,8 @@ struct DevicePorts::Adapters {
           analytics(folders.analyticsFile(), *clock),
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
-          deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)) {}
+          deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
+          memory(*clock) {}
 
     std::unique_ptr<Clock> clock;
     Problems problems;
@@ -87,6 +89,7 @@ struct DevicePorts::Adapters {
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
     IndexerProcess deviceData;
+    MemoryRelease memory;
 };
 
 DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolders& folders,
@@ -101,6 +104,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
     services_.photoAnalysis = &adapters_->photos;
     services_.deviceData = &adapters_->deviceData;
     services_.problems = &adapters_->problems;
+    services_.requestEnded = [adapters = adapters_.get()] { adapters->memory.soon(); };
     services_.cacheFolder = folders.cache;
     services_.exitProcess = [](int status) { ::_exit(status); };
 }

@@ -42,6 +42,8 @@ struct PlatformServices {
     /// The daemon's folder for the database and its property lists; made when missing.
     std::filesystem::path cacheFolder;
     FeatureSwitches switches;
+    /// Says that a request is done with and what it held is free. Any thread may call it.
+    std::function<void()> requestEnded = [] {};
     /// Ends the process at once with this status (a fatal watchdog does).
     std::function<void(int status)> exitProcess;
 };

@@ -37,9 +37,13 @@ class KSDaemonClient::Request {
   public:
     Request(std::string_view name, const PlatformServices& platform,
             std::optional<std::string> processName)
-        : watchDog(name, platform) {
+        : watchDog(name, platform), platform_(platform) {
         if (processName) add({{std::string(kTriggerSource), *processName}});
     }
+
+    ~Request() { platform_.requestEnded(); }
+    Request(const Request&) = delete;
+    Request& operator=(const Request&) = delete;
 
     void add(const KSDictionary& entries) {
         const std::lock_guard lock(mutex_);
@@ -65,6 +69,7 @@ class KSDaemonClient::Request {
     KSWatchDog watchDog;
 
   private:
+    const PlatformServices& platform_;
     mutable std::mutex mutex_;
     KSDictionary payload_;
     OptionalError error_;
