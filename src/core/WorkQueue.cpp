@@ -40,13 +40,12 @@ void runGuarded(const Task& task, const std::string& label) {
 
 struct WorkerThreads::State {
     std::mutex mutex;
-    std::condition_variable work;     // a task was added, or draining began
+    std::condition_variable work;     // a task was added
     std::condition_variable quieter;  // a thread became idle, began to wait or ended
     std::deque<Task> tasks;
     std::size_t threads = 0;
     std::size_t idle = 0;
     std::size_t waiting = 0;
-    bool draining = false;
 
     bool settled() const { return tasks.empty() && threads == idle + waiting; }
 
@@ -57,9 +56,9 @@ struct WorkerThreads::State {
             ++idle;
             quieter.notify_all();
             const bool woken =
-                work.wait_for(lock, kIdleThreadLife, [this] { return !tasks.empty() || draining; });
+                work.wait_for(lock, kIdleThreadLife, [this] { return !tasks.empty(); });
             --idle;
-            if (tasks.empty() && (draining || !woken)) break;
+            if (!woken) break;
             Task task = std::move(tasks.front());
             tasks.pop_front();
             lock.unlock();
@@ -95,14 +94,6 @@ void WorkerThreads::run(Task task) {
 void WorkerThreads::settle() {
     std::unique_lock lock(state_->mutex);
     state_->quieter.wait(lock, [this] { return state_->settled(); });
-}
-
-void WorkerThreads::drain() {
-    std::unique_lock lock(state_->mutex);
-    state_->draining = true;
-    state_->work.notify_all();
-    state_->quieter.wait(lock, [this] { return state_->threads == 0; });
-    state_->draining = false;
 }
 
 bool WorkerThreads::beginWaiting() {

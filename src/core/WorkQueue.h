@@ -24,9 +24,6 @@ class WorkerThreads {
     /// drive a virtual clock: nothing more happens then until time passes or somebody asks.
     void settle();
 
-    /// Ends idle threads and waits for those at work. After it, `run` starts threads anew.
-    void drain();
-
     /// Says that the calling thread waits for another one from now on; whether it is one of these
     /// threads. If so, whoever wakes it calls `endWaiting` at that moment.
     static bool beginWaiting();

@@ -101,11 +101,6 @@ class KSEvent final {
     /// other details stay behind.
     std::shared_ptr<KSEvent> copy() const;
 
-    /// A new record with everything, for replacing a detail.
-    std::shared_ptr<KSEvent> fullCopy() const {
-        return std::shared_ptr<KSEvent>(new KSEvent(*this));
-    }
-
     static std::string describeProvider(KSEventProvider provider);
     static std::string describeCategory(KSEventCategory category);
     std::string describeProvider() const { return describeProvider(provider_); }
