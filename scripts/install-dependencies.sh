@@ -12,7 +12,7 @@ declare -A packages=(
     [test]="bash-completion binutils dbus dbus-daemon libglib2.0-bin libgmock-dev libgtest-dev python3
             python3-dbus python3-seccomp sqlite3 systemd"
     [lint]="clang-19 clang-format-14 clang-tidy-19 libclang-rt-19-dev"
-    [package]="debhelper dpkg-dev lintian"
+    [package]="build-essential debhelper dpkg-dev lintian"
 )
 
 groups=("$@")

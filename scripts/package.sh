@@ -22,6 +22,7 @@ grep -q "^project(keepsakesd VERSION ${version%%-*} " CMakeLists.txt || {
 }
 
 build release --target keepsakesd keepsakesctl keepsakes-indexer
+export DEB_RULES_REQUIRES_ROOT=no
 folder=$PWD/build/package
 log=$folder/package.log
 mkdir -p "$folder"
