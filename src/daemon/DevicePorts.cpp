@@ -50,11 +50,14 @@ OwnerFacts ownerFacts(const Configuration& configuration) {
     return facts;
 }
 
-/// The indexer lies beside the daemon's own program.
+/// The indexer lies beside the daemon's own program in a build folder, and in libexec when they are
+/// installed.
 std::filesystem::path indexerProgram() {
     std::error_code error;
-    const auto self = std::filesystem::read_symlink("/proc/self/exe", error);
-    return self.parent_path() / kIndexerProgram;
+    const auto folder = std::filesystem::read_symlink("/proc/self/exe", error).parent_path();
+    auto beside = folder / kIndexerProgram;
+    if (std::filesystem::exists(beside, error)) return beside;
+    return (folder / KEEPSAKES_LIBEXEC_FROM_BIN / kIndexerProgram).lexically_normal();
 }
 
 IndexerOptions indexerOptions(const Configuration& configuration, std::filesystem::path index) {
