@@ -50,8 +50,11 @@ double timeOfDay(std::optional<ClockTime> time) {
 }
 
 KSTrendsAnalyzerPlans analyticsPlansAt(KSDate now) {
-    const KSDate today =
-        KSExtensions::startOfDayWithBoundaryOfADay(now, kKSTrendsAnalysisBoundaryOfADay);
+    return analyticsPlansOfDay(
+        KSExtensions::startOfDayWithBoundaryOfADay(now, kKSTrendsAnalysisBoundaryOfADay));
+}
+
+KSTrendsAnalyzerPlans analyticsPlansOfDay(KSDate today) {
     const KSDateInterval train{today - kKSTrendsAnalysisTimeRange, today - kDay};
     const KSDateInterval test{today - kDay, today};
     const auto daily = [&](const char* keyword, KSEventCategory category,

@@ -17,6 +17,8 @@ inline constexpr double kKSTrendsAnalysisLongInterval = 1814400;
 /// The daily plans at `now`: yesterday against the 27 days before it. Stored results are matched on
 /// their keywords, odd spellings included.
 KSTrendsAnalyzerPlans analyticsPlansAt(KSDate now);
+/// The same for the day that starts at `today`.
+KSTrendsAnalyzerPlans analyticsPlansOfDay(KSDate today);
 
 /// A time of day as clocks show it.
 struct ClockTime {
