@@ -5,6 +5,7 @@
 #include <pthread.h>
 #include <sys/epoll.h>
 #include <sys/eventfd.h>
+#include <systemd/sd-event.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -26,10 +27,15 @@ namespace keepsakes {
 
 namespace {
 
-using linuxbus::Connection;
-using linuxbus::Event;
-using linuxbus::EventSource;
-using linuxbus::Slot;
+using bus::OwnedConnection;
+using bus::OwnedSlot;
+
+struct EndEvents {
+    void operator()(sd_event* event) const { sd_event_unref(event); }
+    void operator()(sd_event_source* source) const { sd_event_source_disable_unref(source); }
+};
+using OwnedEvent = std::unique_ptr<sd_event, EndEvents>;
+using OwnedEventSource = std::unique_ptr<sd_event_source, EndEvents>;
 
 constexpr const char* kBus = "org.freedesktop.DBus";
 constexpr const char* kBusPath = "/org/freedesktop/DBus";
@@ -61,7 +67,7 @@ double awakeSeconds() {
 /// The watcher's thread: everything here but `start` and `stop` happens on it.
 class MediaWatcher::Loop {
   public:
-    Loop(Connection connection, PlayTracker::Sink sink, Now now)
+    Loop(OwnedConnection connection, PlayTracker::Sink sink, Now now)
         : connection_(std::move(connection)), now_(std::move(now)), tracker_(std::move(sink)) {}
 
     OptionalError start();
@@ -78,8 +84,8 @@ class MediaWatcher::Loop {
         bool asking = false;  ///< Its state is being asked for.
         int signals = 0;      ///< Since `countedFrom`, on the awake clock.
         double countedFrom = 0;
-        Slot properties, seeks, call;
-        EventSource deaf;
+        OwnedSlot properties, seeks, call;
+        OwnedEventSource deaf;
     };
 
     void run();
@@ -114,13 +120,13 @@ class MediaWatcher::Loop {
     std::thread thread_;
 
     // Only on the thread:
-    Connection connection_;
+    OwnedConnection connection_;
     const Now now_;
     PlayTracker tracker_;
-    Event event_;
-    Slot ownerChanges_, names_;
+    OwnedEvent event_;
+    OwnedSlot ownerChanges_, names_;
     std::map<std::string, std::unique_ptr<Player>, std::less<>> players_;  ///< By connection.
-    std::map<std::string, Slot> ownerCalls_;                               ///< By name.
+    std::map<std::string, OwnedSlot> ownerCalls_;                          ///< By name.
     bool full_ = false;  ///< There are players that are not listened to.
 };
 
@@ -153,6 +159,7 @@ OptionalError MediaWatcher::Loop::start() {
     wake_ = ::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
     if (wake_ < 0) return busError("eventfd", -errno);
     thread_ = std::thread([this] { run(); });
+    pthread_setname_np(thread_.native_handle(), "media");
     return std::nullopt;
 }
 
@@ -165,7 +172,6 @@ void MediaWatcher::Loop::stop() {
 }
 
 void MediaWatcher::Loop::run() {
-    pthread_setname_np(pthread_self(), "media");
     prepare();
     if (event_) {
         listen();
@@ -186,7 +192,7 @@ void MediaWatcher::Loop::run() {
 void MediaWatcher::Loop::prepare() {
     sd_event* made = nullptr;
     int result = sd_event_new(&made);
-    Event event(made);
+    OwnedEvent event(made);
     if (result >= 0) {
         result = sd_event_add_io(
             made, nullptr, wake_, EPOLLIN,
@@ -227,7 +233,11 @@ void MediaWatcher::Loop::onNames(sd_bus_message* message) {
     if (sd_bus_message_enter_container(message, 'a', "s") <= 0) return;
     const char* name = nullptr;
     while (sd_bus_message_read_basic(message, 's', &name) > 0) {
-        if (!view(name).starts_with(kNamePrefix) || ownerCalls_.size() >= kMostPlayers) continue;
+        if (!view(name).starts_with(kNamePrefix)) continue;
+        if (ownerCalls_.size() >= kMostPlayers) {
+            full_ = true;
+            return;
+        }
         sd_bus_slot* slot = nullptr;
         sd_bus_call_method_async(connection_.get(), &slot, kBus, kBusPath, kBus, "GetNameOwner",
                                  &Loop::handler<&Loop::onOwner>, this, "s", name);
@@ -295,7 +305,7 @@ void MediaWatcher::Loop::removeName(const std::string& name, const std::string& 
 }
 
 void MediaWatcher::Loop::listenTo(Player& player) {
-    player.countedFrom = now_().awake;
+    player.countedFrom = awakeSeconds();
     player.signals = 0;
     const auto match = [&player](std::string_view interface, std::string_view member) {
         return fmt::format("type='signal',sender='{}',path='{}',interface='{}',member='{}'",
@@ -418,7 +428,7 @@ std::expected<std::unique_ptr<MediaWatcher>, KSError> MediaWatcher::start(PlayTr
     if (const int result = sd_bus_open_user(&opened); result < 0) {
         return std::unexpected(busError("cannot connect to the session bus", result));
     }
-    auto loop = std::make_unique<Loop>(Connection(opened), std::move(sink), std::move(now));
+    auto loop = std::make_unique<Loop>(OwnedConnection(opened), std::move(sink), std::move(now));
     std::unique_ptr<MediaWatcher> watcher(new MediaWatcher(std::move(loop)));
     if (auto error = watcher->loop_->start()) return std::unexpected(std::move(*error));
     return watcher;
