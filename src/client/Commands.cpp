@@ -4,6 +4,8 @@
 #include <fmt/format.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cmath>
 #include <cstdio>
 #include <iostream>
 
@@ -32,6 +34,18 @@ std::string shownEnd(KSDate start, KSDate end) {
     return sameDay ? calendar::format(end, "HH:mm") : shown(end);
 }
 
+/// How often and for how long media were played: "3 times, 1 h 30 min".
+std::string playedText(double repetitions, double seconds) {
+    std::string text;
+    if (repetitions > 0) {
+        text = repetitions == 1 ? "once, " : fmt::format("{:.0f} times, ", repetitions);
+    }
+    const auto minutes = std::llround(std::clamp(seconds / 60, 0.0, 1e9));
+    if (seconds < 60) return text + fmt::format("{:.0f} s", std::max(seconds, 0.0));
+    if (minutes < 60) return text + fmt::format("{} min", minutes);
+    return text + fmt::format("{} h {} min", minutes / 60, minutes % 60);
+}
+
 /// What tells one event from another of its kind.
 std::string detailsOf(const KSEvent& event) {
     std::string details;
@@ -46,6 +60,9 @@ std::string detailsOf(const KSEvent& event) {
     add(event.tripTitle);
     add(event.mediaTitle);
     add(event.mediaArtist);
+    if (event.mediaSumTimePlayed) {
+        add(playedText(event.mediaRepetitions.value_or(0), *event.mediaSumTimePlayed));
+    }
     add(event.itemDisplayName ? event.itemDisplayName : event.itemLinkTitle);
     if (const auto& photos = event.extendedAttributes) {
         for (const auto& word :

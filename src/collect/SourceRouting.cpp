@@ -3,6 +3,7 @@
 
 #include <utility>
 
+#include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSVitalsManager.h"
 
@@ -19,7 +20,9 @@ bool hasNoSource(const KSEventArray& group) {
 
 EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
-      photoManager_(universe.service<KSPhotoManager>("PhotoManager")) {
+      photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
+      nowPlayingMediaManager_(
+          universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")) {
     if (vitalsManager_) {
         steps_.push_back({"resultWorkoutsSuccess",
                           [source = vitalsManager_](KSDate start, KSDate end, ResultHandler done) {
@@ -34,6 +37,13 @@ EventSources::EventSources(const ServiceLookup& universe)
                  source->fetchAndSavePhotoKeepsakesBetweenStartDate(start, end, done);
              }});
     }
+    if (nowPlayingMediaManager_) {
+        steps_.push_back(
+            {"resultMusicSuccess",
+             [source = nowPlayingMediaManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveRepeatedMediaPlayBetweenStartDate(start, end, std::move(done));
+             }});
+    }
 }
 
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
@@ -46,6 +56,13 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->removePhotoEventsDeletedAtSource(group, std::move(handler));
+                return;
+            }
+            break;
+        case KSEventCategory::mediaOnRepeat:
+        case KSEventCategory::leisureMedia:
+            if (nowPlayingMediaManager_) {
+                nowPlayingMediaManager_->removeMediaPlayEventsDeletedAtSource(group, handler);
                 return;
             }
             break;
@@ -65,6 +82,13 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->rehydratePhotoKeepsakes(group, std::move(handler));
+                return;
+            }
+            break;
+        case KSEventCategory::mediaOnRepeat:
+        case KSEventCategory::leisureMedia:
+            if (nowPlayingMediaManager_) {
+                handler(nowPlayingMediaManager_->rehydratedMediaPlayEvents(group), std::nullopt);
                 return;
             }
             break;

@@ -5,12 +5,15 @@
 
 #include <utility>
 
+#include "core/Log.h"
 #include "core/Problems.h"
 #include "daemon/MemoryRelease.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
+#include "devicedata/MediaStreamFile.h"
 #include "linux/AnalyticsLog.h"
 #include "linux/IndexerProcess.h"
+#include "linux/MediaWatcher.h"
 #include "linux/PropertyListDefaults.h"
 #include "platform/DeviceState.h"
 
@@ -19,6 +22,7 @@ namespace keepsakes {
 namespace {
 
 constexpr std::string_view kIndexFile = "deviceData.sqlite";
+constexpr std::string_view kMediaStreamFile = "mediaStream.sqlite";
 constexpr std::string_view kIndexerProgram = "keepsakes-indexer";
 
 class ConfiguredPolicy final : public DevicePolicy {
@@ -69,6 +73,24 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     return options;
 }
 
+/// Writes what the players play; nothing when it is not wanted or there is no bus.
+std::unique_ptr<MediaWatcher> mediaWatcher(bool wanted, MediaStreamFile& stream, Clock& clock) {
+    if (!wanted) return nullptr;
+    auto watcher = MediaWatcher::start(
+        [&stream, failing = false](const NowPlayingRecord& record) mutable {
+            const auto error = stream.append(record);
+            // Once for a streak: a full disk fails with every record.
+            if (error && !failing) logWarning(error->description());
+            failing = error.has_value();
+        },
+        [&clock] {
+            return Moment{clock.now(), awakeSeconds()};
+        });
+    if (watcher) return std::move(*watcher);
+    logWarning(watcher.error().description());
+    return nullptr;
+}
+
 }  // namespace
 
 struct DevicePorts::Adapters {
@@ -81,7 +103,9 @@ struct DevicePorts::Adapters {
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
-          memory(*clock) {}
+          media(folders.cache / kMediaStreamFile, *clock, problems),
+          memory(*clock),
+          watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {}
 
     std::unique_ptr<Clock> clock;
     Problems problems;
@@ -92,7 +116,9 @@ struct DevicePorts::Adapters {
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
     IndexerProcess deviceData;
+    MediaStreamFile media;
     MemoryRelease memory;
+    std::unique_ptr<MediaWatcher> watcher;
 };
 
 DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolders& folders,
@@ -105,6 +131,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
     services_.analytics = &adapters_->analytics;
     services_.healthStore = &adapters_->health;
     services_.photoAnalysis = &adapters_->photos;
+    services_.nowPlayingStream = &adapters_->media;
     services_.deviceData = &adapters_->deviceData;
     services_.problems = &adapters_->problems;
     services_.requestEnded = [adapters = adapters_.get()] { adapters->memory.soon(); };

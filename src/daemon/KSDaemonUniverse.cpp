@@ -14,6 +14,7 @@
 #include "notify/KSTocsinNotifier.h"
 #include "platform/PlatformServices.h"
 #include "service/KSManageServer.h"
+#include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
@@ -38,6 +39,7 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("EventStore", KSEventStore::initWithUniverse(*this));
     add("PhotoManager", KSPhotoManager::initWithUniverse(*this));
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
+    add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
     add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));
     add("EventManager", KSEventManager::initWithUniverse(*this));
     add("EventBundleManager", KSEventBundleManager::initWithUniverse(*this));

@@ -13,6 +13,7 @@ class DeviceDataIndex;
 class DevicePolicy;
 class HealthStore;
 class LockState;
+class NowPlayingStream;
 class PhotoAnalysis;
 class Problems;
 class UserDefaults;
@@ -36,6 +37,7 @@ struct PlatformServices {
     AnalyticsService* analytics = nullptr;
     HealthStore* healthStore = nullptr;
     PhotoAnalysis* photoAnalysis = nullptr;
+    NowPlayingStream* nowPlayingStream = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BusListener* listener = nullptr;
     Problems* problems = nullptr;

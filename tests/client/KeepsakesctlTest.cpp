@@ -181,6 +181,7 @@ TEST_F(KeepsakesctlTest, TablesShowLocalTimesAndBundlesTheirEvents) {
     conduit_.setBundles({samples::bundle({workout})});
     const auto events = run("events").output;
     EXPECT_THAT(events, HasSubstr("2023-03-08 22:26  22:56  "));
+    EXPECT_THAT(events, HasSubstr("Song, Artist, 17 times, 1 h 0 min"));
     EXPECT_THAT(events, HasSubstr("1 event\n"));
     EXPECT_THAT(events, Not(HasSubstr("\033")));
     const auto bundles = run("bundles").output;

@@ -5,6 +5,7 @@
 
 #include "StoreFixture.h"
 #include "model/KSExtensions.h"
+#include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
@@ -23,6 +24,8 @@ class Manager : public StoreFixture {
         universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
         universe->add("PhotoManager", KSPhotoManager::initWithUniverse(*universe));
         universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
+        universe->add("NowPlayingMediaManager",
+                      KSNowPlayingMediaManager::initWithUniverse(*universe));
         events = KSEventManager::initWithUniverse(*universe);
     }
 
@@ -116,6 +119,36 @@ TEST_F(Manager, FetchesInTheOrderAskedForWithDetailsFilledInAgain) {
     EXPECT_EQ(numbersOf(fetched(false)), (std::vector{3, 1, 2}));
     EXPECT_THAT(*fetched(true)[1]->extendedAttributes->photoKeepsakeInferences,
                 ElementsAre("beach"));
+}
+
+TEST_F(Manager, MediaOfBothKindsAreTheirSourcesBusiness) {
+    for (const std::string title : {"Song", "Talk"}) {
+        const auto app = title == "Song" ? "player" : kLeisureMediaBundleId[1];
+        for (const double at : {-5000.0, -4000.0, -3000.0}) {
+            NowPlayingRecord record{.duration = 200, .title = title, .bundleID = std::string(app)};
+            record.absoluteTimestamp = now() + at + static_cast<double>(title.front());
+            platform.media.records.push_back(record);
+            record.playbackState = PlaybackState::paused;
+            record.absoluteTimestamp = record.absoluteTimestamp + 100;
+            platform.media.records.push_back(record);
+        }
+    }
+    EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
+              R"({"resultNumberOfEvents": 2, "stateDatabaseAvailable": true})");
+    KSEventArray filled;
+    events->fetchEventsWithOptions(
+        {}, [&filled](KSEventArray found, const OptionalError&) { filled = std::move(found); });
+    WorkerThreads::shared().settle();
+    ASSERT_EQ(filled.size(), 2u);
+    EXPECT_NE(filled[0]->category(), filled[1]->category());
+    for (const auto& event : filled) EXPECT_EQ(event->mediaRepetitions, 3);
+    std::erase_if(platform.media.records, [](const auto& each) { return each.title == "Talk"; });
+    run(&KSEventManager::cleanUpEventsWithHandler);
+    EXPECT_EQ(fetch({}).size(), 1u);
+    platform.media.nextError = KSError::make("Media", 1, "broken");
+    EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
+              R"({"resultMusicSuccess": false, "resultNumberOfEvents": 0, )"
+              R"("stateDatabaseAvailable": true})");
 }
 
 TEST_F(Manager, CleansWhatExpiredIsUnknownOrWasDeletedAtItsSource) {

@@ -78,6 +78,16 @@ class DaemonProcess : public testing::Test {
         return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
     }
 
+    bool hasThread(const std::string& name) const {
+        const auto tasks = "/proc/" + std::to_string(running) + "/task";
+        for (const auto& task : std::filesystem::directory_iterator(tasks)) {
+            std::ifstream in(task.path() / "comm");
+            std::string comm;
+            if (in >> comm && comm == name) return true;
+        }
+        return false;
+    }
+
     std::string log() const {
         std::ifstream in(folder / "log");
         return {std::istreambuf_iterator<char>(in), {}};
@@ -120,6 +130,34 @@ TEST_F(DaemonProcess, WhatWasAnsweredOutlivesAKillAndFilesBecomeBundles) {
     EXPECT_THAT(status.problems[0], HasSubstr("broken.gpx"));
     EXPECT_EQ(client->fetchEventsWithOptions({}).value().size(), 2u) << "collected once";
     EXPECT_EQ(end(SIGTERM), 0);
+}
+
+TEST_F(DaemonProcess, ASongOnRepeatBecomesABundle) {
+    startAndConnect();
+    SQLite::Database((folder / "cache/com.brindle.keepsakesd/mediaStream.sqlite").string(),
+                     SQLite::OPEN_READWRITE, 5000)
+        .exec(
+            "WITH plays(start) AS (VALUES (740217600), (740218000), (740219000)), "
+            "     states(state, after) AS (VALUES (1, 0), (2, 180)) "
+            "INSERT INTO records(timestamp, state, duration, title, artist) "
+            "SELECT start + after, state, 200, 'Song', 'Band' FROM plays, states "
+            "ORDER BY start, state");
+    ASSERT_FALSE(client->collectEvents());
+    ASSERT_FALSE(client->bundleEvents());
+    const auto bundles = client->fetchEventBundlesWithOptions({}).value();
+    ASSERT_EQ(bundles.size(), 1u);
+    EXPECT_THAT(*bundles[0]->promptLanguage,
+                HasSubstr("Played again and again: Song by Band (3 times), Sunday"));
+    EXPECT_EQ(bundles[0]->events[0]->mediaSumTimePlayed, 540);
+}
+
+TEST_F(DaemonProcess, ListensToPlayersUnlessTheOwnerSaysNo) {
+    for (const bool wanted : {true, false}) {
+        configure(std::string("tracks = []\nphotos = []\nmedia = ") + (wanted ? "true" : "false"));
+        startAndConnect();
+        EXPECT_EQ(hasThread("media"), wanted);
+        EXPECT_EQ(end(SIGTERM), 0);
+    }
 }
 
 TEST_F(DaemonProcess, SigtermDuringACollectionEndsInOrder) {

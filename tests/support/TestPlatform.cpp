@@ -81,6 +81,19 @@ PhotoAnalysis::Summary FakePhotoAnalysis::summary(std::span<const std::string> i
     });
 }
 
+void FakeNowPlayingStream::read(KSDate start, const EachRecord& each,
+                                const std::function<void(OptionalError)>& completion) {
+    asked.push_back(start);
+    if (nextError) {
+        completion(std::exchange(nextError, std::nullopt));
+        return;
+    }
+    for (const auto& record : records) {
+        if (record.absoluteTimestamp >= start) each(record);
+    }
+    completion(std::nullopt);
+}
+
 void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
     const std::lock_guard lock(mutex_);
     sent_.emplace_back(event, fields);
@@ -116,6 +129,7 @@ TestPlatform::TestPlatform() {
     services.analytics = &analytics;
     services.healthStore = &health;
     services.photoAnalysis = &photos;
+    services.nowPlayingStream = &media;
     services.deviceData = &deviceData;
     services.problems = &problems;
     services.cacheFolder = folder / "cache";

@@ -17,6 +17,7 @@
 #include "platform/DeviceDataIndex.h"
 #include "platform/DeviceState.h"
 #include "platform/HealthStore.h"
+#include "platform/MediaStream.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
 #include "platform/UserDefaults.h"
@@ -68,6 +69,17 @@ class FakePhotoAnalysis final : public PhotoAnalysis {
   private:
     template <class Wanted>
     Summary summaryOf(const Wanted& wanted);
+};
+
+/// A now-playing stream in memory, likewise.
+class FakeNowPlayingStream final : public NowPlayingStream {
+  public:
+    std::vector<NowPlayingRecord> records;
+    std::optional<KSError> nextError;
+    std::vector<KSDate> asked;
+
+    void read(KSDate start, const EachRecord& each,
+              const std::function<void(OptionalError)>& completion) override;
 };
 
 class FakeAnalytics final : public AnalyticsService {
@@ -123,6 +135,7 @@ struct TestPlatform {
     Problems problems;
     FakeHealthStore health;
     FakePhotoAnalysis photos;
+    FakeNowPlayingStream media;
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
