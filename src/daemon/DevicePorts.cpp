@@ -10,10 +10,12 @@
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "linux/AnalyticsLog.h"
+#include "linux/BusThread.h"
 #include "linux/IndexerProcess.h"
+#include "linux/LogindLockState.h"
 #include "linux/PropertyListDefaults.h"
+#include "linux/UPowerSources.h"
 #include "platform/DeviceState.h"
-#include "platform/PowerSources.h"
 #include "platform/SystemNotifications.h"
 
 namespace keepsakes {
@@ -22,18 +24,6 @@ namespace {
 
 constexpr std::string_view kIndexFile = "deviceData.sqlite";
 constexpr std::string_view kIndexerProgram = "keepsakes-indexer";
-
-class ConfiguredPolicy final : public DevicePolicy {
-  public:
-    ConfiguredPolicy(bool diagnostics, bool healthData)
-        : diagnostics_(diagnostics), healthData_(healthData) {}
-    bool diagnosticSubmissionAllowed() const override { return diagnostics_; }
-    bool healthDataSubmissionAllowed() const override { return healthData_; }
-
-  private:
-    const bool diagnostics_;
-    const bool healthData_;
-};
 
 /// A device that does not lock its files away.
 class NoContentProtection final : public LockState {
@@ -44,16 +34,13 @@ class NoContentProtection final : public LockState {
     Observation observe(const WorkQueue&, Task) override { return nullptr; }
 };
 
-/// A device that tells nothing of its power.
-class NoPowerSources final : public PowerSources {
-  public:
-    Observation observeSources(const WorkQueue&,
-                               std::function<void(const std::shared_ptr<PowerSource>&)>) override {
-        return nullptr;
-    }
-    bool hasExternalPower() const override { return true; }
-    Observation observeExternalPower(const WorkQueue&, Task) override { return nullptr; }
-};
+/// logind is asked only where the owner wants the database to wait for it.
+std::unique_ptr<LockState> lockStateFor(const Configuration& configuration, BusThread& bus,
+                                        Problems& problems) {
+    if (!configuration.device.contentProtection) return std::make_unique<NoContentProtection>();
+    LogindLockState::Owner owner{::getuid(), processEnvironment()("XDG_SESSION_ID")};
+    return std::make_unique<LogindLockState>(bus, std::move(owner), problems);
+}
 
 OwnerFacts ownerFacts(const Configuration& configuration) {
     OwnerFacts facts;
@@ -83,23 +70,32 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
 }  // namespace
 
 struct DevicePorts::Adapters {
-    Adapters(const Configuration& configuration, const StandardFolders& folders,
-             std::unique_ptr<Clock> clockToUse)
+    Adapters(const Configuration& configuration, ConfiguredPolicy::Load reload,
+             const StandardFolders& folders, std::unique_ptr<Clock> clockToUse)
         : clock(std::move(clockToUse)),
-          policy(configuration.policy.diagnostics, configuration.policy.healthData),
+          policy(configuration, std::move(reload), *clock, notifications, problems),
+          systemBus(BusThread::Bus::system, *clock),
+          lock(lockStateFor(configuration, systemBus, problems)),
+          power(systemBus),
           defaults(folders.defaultsFolder()),
           analytics(folders.analyticsFile(), *clock),
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
-          memory(*clock) {}
+          memory(*clock) {
+        systemBus.start();
+    }
+    ~Adapters() { systemBus.stop(); }
+    Adapters(const Adapters&) = delete;
+    Adapters& operator=(const Adapters&) = delete;
 
     std::unique_ptr<Clock> clock;
     Problems problems;
-    ConfiguredPolicy policy;
-    NoContentProtection lock;
-    NoPowerSources power;
     SystemNotifications notifications;
+    ConfiguredPolicy policy;
+    BusThread systemBus;
+    std::unique_ptr<LockState> lock;
+    UPowerSources power;
     PropertyListDefaults defaults;
     AnalyticsLog analytics;
     IndexedHealthStore health;
@@ -108,12 +104,13 @@ struct DevicePorts::Adapters {
     MemoryRelease memory;
 };
 
-DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolders& folders,
-                         std::unique_ptr<Clock> clock)
-    : adapters_(std::make_unique<Adapters>(configuration, folders, std::move(clock))) {
+DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::Load reload,
+                         const StandardFolders& folders, std::unique_ptr<Clock> clock)
+    : adapters_(
+          std::make_unique<Adapters>(configuration, std::move(reload), folders, std::move(clock))) {
     services_.clock = adapters_->clock.get();
     services_.devicePolicy = &adapters_->policy;
-    services_.lockState = &adapters_->lock;
+    services_.lockState = adapters_->lock.get();
     services_.powerSources = &adapters_->power;
     services_.systemNotifications = &adapters_->notifications;
     services_.userDefaults = &adapters_->defaults;
@@ -128,5 +125,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
 }
 
 DevicePorts::~DevicePorts() = default;
+
+ConfiguredPolicy& DevicePorts::policy() { return adapters_->policy; }
 
 }  // namespace keepsakes
