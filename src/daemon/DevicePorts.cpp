@@ -12,10 +12,14 @@
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "devicedata/MediaStreamFile.h"
 #include "linux/AnalyticsLog.h"
+#include "linux/BusThread.h"
 #include "linux/IndexerProcess.h"
+#include "linux/LogindLockState.h"
 #include "linux/MediaWatcher.h"
 #include "linux/PropertyListDefaults.h"
+#include "linux/UPowerSources.h"
 #include "platform/DeviceState.h"
+#include "platform/SystemNotifications.h"
 
 namespace keepsakes {
 
@@ -25,25 +29,22 @@ constexpr std::string_view kIndexFile = "deviceData.sqlite";
 constexpr std::string_view kMediaStreamFile = "mediaStream.sqlite";
 constexpr std::string_view kIndexerProgram = "keepsakes-indexer";
 
-class ConfiguredPolicy final : public DevicePolicy {
-  public:
-    ConfiguredPolicy(bool diagnostics, bool healthData)
-        : diagnostics_(diagnostics), healthData_(healthData) {}
-    bool diagnosticSubmissionAllowed() const override { return diagnostics_; }
-    bool healthDataSubmissionAllowed() const override { return healthData_; }
-
-  private:
-    const bool diagnostics_;
-    const bool healthData_;
-};
-
 /// A device that does not lock its files away.
 class NoContentProtection final : public LockState {
   public:
     bool formattedForContentProtection() const override { return false; }
     bool unlockedSinceBoot() const override { return true; }
     int currentState() const override { return 0; }
+    Observation observe(const WorkQueue&, Task) override { return nullptr; }
 };
+
+/// logind is asked only where the owner wants the database to wait for it.
+std::unique_ptr<LockState> lockStateFor(const Configuration& configuration, BusThread& bus,
+                                        Problems& problems) {
+    if (!configuration.device.contentProtection) return std::make_unique<NoContentProtection>();
+    LogindLockState::Owner owner{::getuid(), processEnvironment()("XDG_SESSION_ID")};
+    return std::make_unique<LogindLockState>(bus, std::move(owner), problems);
+}
 
 OwnerFacts ownerFacts(const Configuration& configuration) {
     OwnerFacts facts;
@@ -94,10 +95,13 @@ std::unique_ptr<MediaWatcher> mediaWatcher(bool wanted, MediaStreamFile& stream,
 }  // namespace
 
 struct DevicePorts::Adapters {
-    Adapters(const Configuration& configuration, const StandardFolders& folders,
-             std::unique_ptr<Clock> clockToUse)
+    Adapters(const Configuration& configuration, ConfiguredPolicy::Load reload,
+             const StandardFolders& folders, std::unique_ptr<Clock> clockToUse)
         : clock(std::move(clockToUse)),
-          policy(configuration.policy.diagnostics, configuration.policy.healthData),
+          policy(configuration, std::move(reload), *clock, notifications, problems),
+          systemBus(BusThread::Bus::system, *clock),
+          lock(lockStateFor(configuration, systemBus, problems)),
+          power(systemBus),
           defaults(folders.defaultsFolder()),
           analytics(folders.analyticsFile(), *clock),
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
@@ -105,12 +109,20 @@ struct DevicePorts::Adapters {
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           media(folders.cache / kMediaStreamFile, *clock, problems),
           memory(*clock),
-          watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {}
+          watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {
+        systemBus.start();
+    }
+    ~Adapters() { systemBus.stop(); }
+    Adapters(const Adapters&) = delete;
+    Adapters& operator=(const Adapters&) = delete;
 
     std::unique_ptr<Clock> clock;
     Problems problems;
+    SystemNotifications notifications;
     ConfiguredPolicy policy;
-    NoContentProtection lock;
+    BusThread systemBus;
+    std::unique_ptr<LockState> lock;
+    UPowerSources power;
     PropertyListDefaults defaults;
     AnalyticsLog analytics;
     IndexedHealthStore health;
@@ -121,12 +133,15 @@ struct DevicePorts::Adapters {
     std::unique_ptr<MediaWatcher> watcher;
 };
 
-DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolders& folders,
-                         std::unique_ptr<Clock> clock)
-    : adapters_(std::make_unique<Adapters>(configuration, folders, std::move(clock))) {
+DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::Load reload,
+                         const StandardFolders& folders, std::unique_ptr<Clock> clock)
+    : adapters_(
+          std::make_unique<Adapters>(configuration, std::move(reload), folders, std::move(clock))) {
     services_.clock = adapters_->clock.get();
     services_.devicePolicy = &adapters_->policy;
-    services_.lockState = &adapters_->lock;
+    services_.lockState = adapters_->lock.get();
+    services_.powerSources = &adapters_->power;
+    services_.systemNotifications = &adapters_->notifications;
     services_.userDefaults = &adapters_->defaults;
     services_.analytics = &adapters_->analytics;
     services_.healthStore = &adapters_->health;
@@ -140,5 +155,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
 }
 
 DevicePorts::~DevicePorts() = default;
+
+ConfiguredPolicy& DevicePorts::policy() { return adapters_->policy; }
 
 }  // namespace keepsakes

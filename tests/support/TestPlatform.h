@@ -15,12 +15,13 @@
 #include "core/WorkQueue.h"
 #include "platform/AnalyticsService.h"
 #include "platform/DeviceDataIndex.h"
-#include "platform/DeviceState.h"
 #include "platform/HealthStore.h"
 #include "platform/MediaStream.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
+#include "platform/SystemNotifications.h"
 #include "platform/UserDefaults.h"
+#include "support/FakeDeviceState.h"
 #include "support/TemporaryFolder.h"
 #include "support/VirtualClock.h"
 
@@ -100,22 +101,6 @@ class FakeDefaults final : public UserDefaults {
                             const KSValue& value) override;
 };
 
-class FakeLockState final : public LockState {
-  public:
-    bool protects = false;
-    bool unlocked = false;
-    int current = 0;
-    bool formattedForContentProtection() const override { return protects; }
-    bool unlockedSinceBoot() const override { return unlocked; }
-    int currentState() const override { return current; }
-};
-
-class FakeDevicePolicy final : public DevicePolicy {
-  public:
-    bool diagnosticSubmissionAllowed() const override { return true; }
-    bool healthDataSubmissionAllowed() const override { return true; }
-};
-
 class FakeDeviceData final : public DeviceDataIndex {
   public:
     ScanReport report;
@@ -139,6 +124,8 @@ struct TestPlatform {
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
+    FakePowerSources power;
+    SystemNotifications notifications;
     FakeDevicePolicy policy;
     FakeDeviceData deviceData;
     std::vector<int> exits;
