@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cstring>
 #include <limits>
 
 #include "readers/ReaderLimits.h"
@@ -90,9 +91,7 @@ class FitBytes {
         while (done < into.size()) {
             if (at_ == filled_ && !refill()) return false;
             const auto count = std::min(into.size() - done, filled_ - at_);
-            std::ranges::transform(std::span(block_).subspan(at_, count),
-                                   into.begin() + static_cast<std::ptrdiff_t>(done),
-                                   [](char c) { return static_cast<std::uint8_t>(c); });
+            std::memcpy(into.subspan(done).data(), block_.data() + at_, count);
             done += count;
             at_ += count;
             position_ += count;
