@@ -160,8 +160,9 @@ TEST(GeoJsonReader, ReadsPointsWithATimeAndPlacesWithAName) {
         {"named places, the type of the collection last",
          R"({"features": [)" + point(R"("name": " Zuhause\n")") + "," +
              point(R"("title": "Praxis", "use": "work")") + "," +
-             point(R"("date": "2020-01-01", "location": {"name": "Uhrturm"})") + "," + point("") +
-             R"(], "type": "FeatureCollection"})",
+             point(R"("time": "?", "name": "no place")") + "," +
+             point(R"("date": "2020-01-01", "time": null, "location": {"name": "Uhrturm"})") + "," +
+             point("") + R"(], "type": "FeatureCollection"})",
          "place 47.0000 15.5000 'Zuhause' home\nplace 47.0000 15.5000 'Praxis' work\n"
          "place 47.0000 15.5000 'Uhrturm'\n"},
         {"lines with times, and one whose times are too few",
@@ -209,7 +210,7 @@ TEST(OwnTracksReader, ReadsLocationsAndWaypoints) {
 }
 
 TEST(LocationFiles, AreRefusedWithTheReason) {
-    const auto times = [](int count, const std::string& text) {
+    const auto repeated = [](int count, const std::string& text) {
         std::string all;
         for (int i = 0; i < count; ++i) all += text;
         return all;
@@ -223,17 +224,17 @@ TEST(LocationFiles, AreRefusedWithTheReason) {
         {begin + "}]} x", "byte 36: not well-formed JSON"},
         {begin + "}]}" + std::string(2, '\0'), "bytes follow the document"},
         {begin + ", \"x\": \"\xE4\"}]}", "byte 41: not well-formed JSON"},
-        {begin + ", \"x\": " + times(100, "["), "elements are nested too deep"},
+        {begin + ", \"x\": " + repeated(100, "["), "elements are nested too deep"},
         {begin + ", \"x\": \"" + std::string(3U << 20U, 'x'), "a value is too long"},
-        {begin + ", \"x\": [" + times(1U << 20U, "[],"), "a value is too long"},
+        {begin + ", \"x\": [" + repeated(1U << 20U, "[],"), "a value is too long"},
         {begin + ", \"x\": " + std::string(3U << 20U, '1'), "a value is too long"},
         {begin + ", \"x\": 1e999}]}", "not well-formed JSON"},
         {records(R"({"latitudeE7": 1, "timestamp": "1970-01-01"})"),
          "no timestamp lies between 1990-01-01"},
         {records(R"({"latitudeE7": 1, "timestamp": "noon"})"), "no timestamp can be read"},
-        {line + times(500'000, "[1,2],") + "[3,4]]}}", "a line of more than 500000 points"},
+        {line + repeated(500'000, "[1,2],") + "[3,4]]}}", "a line of more than 500000 points"},
         {R"([{"visit": 1, "timelinePath": [)" +
-             times(500'000, R"({"point":"geo:1,2","durationMinutesOffsetFromStartTime":1},)") +
+             repeated(500'000, R"({"point":"geo:1,2","durationMinutesOffsetFromStartTime":1},)") +
              R"({"point":"geo:1,2","durationMinutesOffsetFromStartTime":1}]}])",
          "a path of more than 500000 points"},
     };
