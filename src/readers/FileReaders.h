@@ -8,6 +8,7 @@
 
 #include "core/KSDate.h"
 #include "readers/FileRecords.h"
+#include "readers/LocationRecords.h"
 
 namespace keepsakes {
 
@@ -17,13 +18,14 @@ namespace keepsakes {
 // stands does not matter and does not change. What a file cannot be read for comes back as one
 // line that names the reason and, for XML, the line; no bytes make a reader throw.
 
-enum class FileKind { unknown, track, photo };
+enum class FileKind { unknown, track, photo, fit, ownTracks, locationHistory, geoJson };
 
 /// So many bytes from the start of a file are enough for `kindOf`.
 inline constexpr std::size_t kHeadSize = 4096;
 
 /// Tells the kind by the first bytes, never by a name: GPX and TCX by their root element (in UTF-8
-/// or UTF-16, after comments and the like), JPEG, PNG and HEIF by their signatures.
+/// or UTF-16, after comments and the like); JPEG, PNG, HEIF and FIT by their signatures; OwnTracks
+/// recordings by their first line; JSON by the names that its first elements have.
 FileKind kindOf(std::span<const std::byte> head);
 
 struct ReaderContext {
@@ -36,5 +38,27 @@ std::expected<FileRecords, std::string> readTrackFile(int fd, const ReaderContex
 
 /// The one photo that a JPEG, PNG or HEIF file is, by its metadata.
 std::expected<FileRecords, std::string> readPhotoFile(int fd, const ReaderContext& context);
+
+// The following hand what the file says of places to the sink while they read. When they answer an
+// error, the sink has got a part of a file that is not to be believed.
+
+/// The points and sessions (as workouts) of a FIT recording, and the zone that it states. What
+/// stands in one that ends early counts up to there.
+std::expected<FileRecords, std::string> readFitFile(int fd, const ReaderContext& context,
+                                                    LocationSink& places);
+
+/// The points of a recording that an OwnTracks recorder keeps (.rec), and the owner's waypoints.
+std::expected<FileRecords, std::string> readOwnTracksFile(int fd, const ReaderContext& context,
+                                                          LocationSink& places);
+
+/// The points, stays and labelled places of a Google location history: raw records, the semantic
+/// form, or what a device exports itself; and the zones that it states.
+std::expected<FileRecords, std::string> readLocationHistoryFile(int fd,
+                                                                const ReaderContext& context,
+                                                                LocationSink& places);
+
+/// Of a GeoJSON file the points with a time, and the points without one that have a name.
+std::expected<FileRecords, std::string> readGeoJsonFile(int fd, const ReaderContext& context,
+                                                        LocationSink& places);
 
 }  // namespace keepsakes

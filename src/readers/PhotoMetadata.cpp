@@ -17,6 +17,7 @@
 #include "readers/DescriptorIo.h"
 #include "readers/FileReaders.h"
 #include "readers/HeifItems.h"
+#include "readers/Position.h"
 #include "readers/ReaderLimits.h"
 #include "readers/TextFolding.h"
 
@@ -107,12 +108,6 @@ std::optional<double> sexagesimal(const Exiv2::Value& value) {
     return *whole + rational(value, 1).value_or(0) / 60 + rational(value, 2).value_or(0) / 3600;
 }
 
-std::optional<GeoPoint> checked(double latitude, double longitude) {
-    if (!(std::abs(latitude) <= 90) || !(std::abs(longitude) <= 180)) return std::nullopt;
-    if (latitude == 0 && longitude == 0) return std::nullopt;
-    return GeoPoint{latitude, longitude};
-}
-
 class ExifBlock {
   public:
     explicit ExifBlock(const Exiv2::ExifData& data) : data_(data) {}
@@ -134,7 +129,7 @@ class ExifBlock {
         const auto latitude = degrees("Exif.GPSInfo.GPSLatitude", 'N', 'S');
         const auto longitude = degrees("Exif.GPSInfo.GPSLongitude", 'E', 'W');
         if (!latitude || !longitude) return std::nullopt;
-        return checked(*latitude, *longitude);
+        return geoPoint(*latitude, *longitude);
     }
 
   private:
@@ -245,7 +240,7 @@ class XmpBlock {
         const auto latitude = xmpDegrees(latitude_, 'N', 'S');
         const auto longitude = xmpDegrees(longitude_, 'E', 'W');
         if (!latitude || !longitude) return std::nullopt;
-        return checked(*latitude, *longitude);
+        return geoPoint(*latitude, *longitude);
     }
 
     /// Keywords, persons and events, added to what other blocks had.

@@ -12,6 +12,7 @@
 #include <utility>
 #include <vector>
 
+#include "readers/Position.h"
 #include "readers/ReaderLimits.h"
 #include "readers/TrackSummary.h"
 
@@ -113,13 +114,6 @@ std::optional<double> number(std::optional<std::string_view> text) {
         return std::nullopt;
     }
     return value;
-}
-
-std::optional<GeoPoint> geoPoint(std::optional<double> latitude, std::optional<double> longitude) {
-    if (!latitude || !longitude) return std::nullopt;
-    if (std::abs(*latitude) > 90 || std::abs(*longitude) > 180) return std::nullopt;
-    if (*latitude == 0 && *longitude == 0) return std::nullopt;
-    return GeoPoint{*latitude, *longitude};
 }
 
 class TrackFile final : public XmlHandler {
@@ -302,7 +296,7 @@ class TrackFile final : public XmlHandler {
     std::uint64_t unreadableTimes_ = 0;
 
     std::optional<TrackSummary> track_;
-    TrackPoint point_;
+    TrackSample point_;
     std::optional<ParsedDate> pointTime_;
     std::optional<double> latitude_;
     std::optional<double> longitude_;

@@ -37,7 +37,7 @@ double distanceBetween(const GeoPoint& a, const GeoPoint& b) {
     return 2 * kEarthRadius * std::asin(std::min(1.0, std::sqrt(h)));
 }
 
-std::optional<double> legLength(const TrackPoint& from, const TrackPoint& to) {
+std::optional<double> legLength(const TrackSample& from, const TrackSample& to) {
     if (from.position && to.position) return distanceBetween(*from.position, *to.position);
     if (from.distance && to.distance) return std::abs(*to.distance - *from.distance);
     return std::nullopt;
@@ -45,7 +45,7 @@ std::optional<double> legLength(const TrackPoint& from, const TrackPoint& to) {
 
 }  // namespace
 
-void SpeedProfile::add(const TrackPoint& point) {
+void SpeedProfile::add(const TrackSample& point) {
     if (!point.position && !point.distance) return;
     if (!from_) {
         from_ = point;
@@ -90,7 +90,7 @@ std::optional<int> activityOfSpeed(const SpeedProfile& speed) {
     return std::nullopt;
 }
 
-void TrackSummary::addPoint(const TrackPoint& point) {
+void TrackSummary::addPoint(const TrackSample& point) {
     widen(points_, {point.time, point.time});
     // UTC is what most files are written in, wherever the owner was: it tells no zone.
     if (point.offsetSeconds && *point.offsetSeconds != 0) {

@@ -14,7 +14,7 @@
 namespace keepsakes {
 
 /// One recorded point, with what of it could be read.
-struct TrackPoint {
+struct TrackSample {
     KSDate time;
     std::optional<int> offsetSeconds;  ///< Absent when the timestamp names no zone.
     std::optional<GeoPoint> position;
@@ -27,7 +27,7 @@ class SpeedProfile {
   public:
     /// Legs are measured between points some seconds apart: closer ones tell the receiver's noise,
     /// farther ones a pause.
-    void add(const TrackPoint& point);
+    void add(const TrackSample& point);
 
     /// The next point is not reached from the last one.
     void breakLeg() { from_.reset(); }
@@ -43,7 +43,7 @@ class SpeedProfile {
     static constexpr double kBinWidth = 0.1;
     static constexpr std::size_t kBins = 1000;
 
-    std::optional<TrackPoint> from_;
+    std::optional<TrackSample> from_;
     std::array<float, kBins> seconds_{};
     double moving_ = 0;    // seconds
     double measured_ = 0;  // seconds
@@ -64,7 +64,7 @@ class TrackSummary {
     void breakLeg() { speed_.breakLeg(); }
 
     /// Only points whose time is sane.
-    void addPoint(const TrackPoint& point);
+    void addPoint(const TrackSample& point);
 
     /// A lap's span, used where fewer than two points have a time of their own.
     void addLap(KSDateInterval lap);
