@@ -9,6 +9,7 @@
 #include "daemon/MemoryRelease.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
+#include "linux/ActivityTimers.h"
 #include "linux/AnalyticsLog.h"
 #include "linux/IndexerProcess.h"
 #include "linux/PropertyListDefaults.h"
@@ -66,6 +67,13 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     return options;
 }
 
+std::vector<ActivityCriteria> activityCriteria(const Configuration& configuration) {
+    const auto& set = configuration.activities;
+    return {{"com.brindle.keepsakesd.eventCollection", set.collection, set.requireExternalPower},
+            {"com.brindle.keepsakesd.eventCompute", set.compute, set.requireExternalPower},
+            {"com.brindle.keepsakesd.eventPurge", set.purge, set.requireExternalPower}};
+}
+
 }  // namespace
 
 struct DevicePorts::Adapters {
@@ -78,6 +86,7 @@ struct DevicePorts::Adapters {
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
+          activities(*clock, activityCriteria(configuration), folders.activitiesFile()),
           memory(*clock) {}
 
     std::unique_ptr<Clock> clock;
@@ -89,6 +98,7 @@ struct DevicePorts::Adapters {
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
     IndexerProcess deviceData;
+    ActivityTimers activities;
     MemoryRelease memory;
 };
 
@@ -103,6 +113,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
     services_.healthStore = &adapters_->health;
     services_.photoAnalysis = &adapters_->photos;
     services_.deviceData = &adapters_->deviceData;
+    services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;
     services_.requestEnded = [adapters = adapters_.get()] { adapters->memory.soon(); };
     services_.cacheFolder = folders.cache;

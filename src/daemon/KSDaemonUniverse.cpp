@@ -13,6 +13,9 @@
 #include "notify/KSDaemonSPINotifier.h"
 #include "notify/KSTocsinNotifier.h"
 #include "platform/PlatformServices.h"
+#include "schedulers/KSEventCollectionScheduler.h"
+#include "schedulers/KSEventComputeScheduler.h"
+#include "schedulers/KSEventPurgeScheduler.h"
 #include "service/KSManageServer.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSVitalsManager.h"
@@ -44,6 +47,17 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     const auto server = KSManageServer::initWithUniverse(*this);
     add("Server", server);
     add("DaemonClientNotifier", server->getNotifier());
+    const auto& switches = platform.switches;
+    const auto collect =
+        KSEventCollectionScheduler::initWithUniverse(*this, switches.collectEnabled);
+    add("EventCollectionScheduler", collect);
+    add("EventCollectionSchedulerNotifier", collect->notifier());
+    const auto compute = KSEventComputeScheduler::initWithUniverse(*this, switches.computeEnabled);
+    add("EventComputeScheduler", compute);
+    add("EventComputeSchedulerNotifier", compute->notifier());
+    const auto purge = KSEventPurgeScheduler::initWithUniverse(*this, switches.purgeEnabled);
+    add("EventPurgeScheduler", purge);
+    add("EventPurgeSchedulerNotifier", purge->notifier());
 }
 
 KSDaemonUniverse::~KSDaemonUniverse() {

@@ -19,6 +19,7 @@
 #include "daemon/KSDaemonUniverse.h"
 #include "daemon/MainLoop.h"
 #include "daemon/ProgressReport.h"
+#include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/DeviceState.h"
 #include "store/KSPersistenceManager.h"
@@ -120,6 +121,7 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     // First what feeds the services, then they themselves.
     const auto limit = limitOnEnding(*services.clock, endQueue);
     (*listener)->invalidate();
+    services.activities->stop();
     services.deviceData->stop();
     WorkerThreads::shared().settle();
     universe.reset();

@@ -7,6 +7,7 @@
 namespace keepsakes {
 
 class AnalyticsService;
+class BackgroundActivities;
 class BusListener;
 class Clock;
 class DeviceDataIndex;
@@ -37,6 +38,7 @@ struct PlatformServices {
     HealthStore* healthStore = nullptr;
     PhotoAnalysis* photoAnalysis = nullptr;
     DeviceDataIndex* deviceData = nullptr;
+    BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;
     Problems* problems = nullptr;
     /// The daemon's folder for the database and its property lists; made when missing.
