@@ -14,6 +14,8 @@
 #include "linux/IndexerProcess.h"
 #include "linux/PropertyListDefaults.h"
 #include "platform/DeviceState.h"
+#include "platform/PowerSources.h"
+#include "platform/SystemNotifications.h"
 
 namespace keepsakes {
 
@@ -40,6 +42,18 @@ class NoContentProtection final : public LockState {
     bool formattedForContentProtection() const override { return false; }
     bool unlockedSinceBoot() const override { return true; }
     int currentState() const override { return 0; }
+    Observation observe(const WorkQueue&, Task) override { return nullptr; }
+};
+
+/// A device that tells nothing of its power.
+class NoPowerSources final : public PowerSources {
+  public:
+    Observation observeSources(const WorkQueue&,
+                               std::function<void(const std::shared_ptr<PowerSource>&)>) override {
+        return nullptr;
+    }
+    bool hasExternalPower() const override { return true; }
+    Observation observeExternalPower(const WorkQueue&, Task) override { return nullptr; }
 };
 
 OwnerFacts ownerFacts(const Configuration& configuration) {
@@ -86,13 +100,15 @@ struct DevicePorts::Adapters {
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
-          activities(*clock, activityCriteria(configuration), folders.activitiesFile()),
+          activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           memory(*clock) {}
 
     std::unique_ptr<Clock> clock;
     Problems problems;
     ConfiguredPolicy policy;
     NoContentProtection lock;
+    NoPowerSources power;
+    SystemNotifications notifications;
     PropertyListDefaults defaults;
     AnalyticsLog analytics;
     IndexedHealthStore health;
@@ -108,6 +124,8 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
     services_.clock = adapters_->clock.get();
     services_.devicePolicy = &adapters_->policy;
     services_.lockState = &adapters_->lock;
+    services_.powerSources = &adapters_->power;
+    services_.systemNotifications = &adapters_->notifications;
     services_.userDefaults = &adapters_->defaults;
     services_.analytics = &adapters_->analytics;
     services_.healthStore = &adapters_->health;

@@ -34,8 +34,7 @@ constexpr double kDisabledLifeSeconds = 10;
 KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     : platform_(platform), exitQueue_("KSFeatureDisabledExit") {
     // Each may look up, while it is made, only what stands above it.
-    add("TocsinNotifier",
-        std::make_shared<KSTocsinNotifier>("TocsinNotifier", *platform.lockState));
+    add("TocsinNotifier", std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform));
     add("PersistenceManager", KSPersistenceManager::initWithUniverse(*this));
     add("EventBundleStore", KSEventBundleStore::initWithUniverse(*this));
     add("EventStore", KSEventStore::initWithUniverse(*this));

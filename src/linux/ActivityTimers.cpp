@@ -8,6 +8,7 @@
 #include <atomic>
 #include <cerrno>
 #include <cmath>
+#include <mutex>
 #include <optional>
 #include <utility>
 
@@ -15,7 +16,10 @@
 #include "core/Files.h"
 #include "core/KSAssertion.h"
 #include "core/Log.h"
+#include "core/Observers.h"
 #include "core/PropertyList.h"
+#include "core/WorkQueue.h"
+#include "platform/PowerSources.h"
 
 namespace keepsakes {
 
@@ -58,16 +62,16 @@ class TimedRun final : public ActivityRun {
 
 }  // namespace
 
-/// Shared with the runs under way, whose ends may come late. All on its queue.
+/// Shared with the runs under way, whose ends may come late. On its queue but where it says so.
 class ActivityTimers::State : public std::enable_shared_from_this<State> {
   public:
-    State(Clock& clock, std::vector<ActivityCriteria> criteria, std::filesystem::path stateFile);
+    State(Clock& clock, PowerSources& power, std::vector<ActivityCriteria> criteria,
+          std::filesystem::path stateFile);
 
     void add(std::string_view identifier, ActivityBlock block);
     void remove(std::string_view identifier);
-    std::vector<std::string> describe() const;
     void stop();
-    void setExternalPower(bool connected);
+    std::string describe(std::string_view identifier) const;  // on any thread
 
     WorkQueue& queue() { return queue_; }
 
@@ -75,42 +79,55 @@ class ActivityTimers::State : public std::enable_shared_from_this<State> {
     struct Activity {
         ActivityCriteria criteria;
         std::optional<KSDate> lastStart;  // of the last run that finished
-        ActivityBlock block;              // null while nothing is registered
-        double due = 0;                   // on the clock's elapsed time, as what follows
+        bool registered = false;
+        bool running = false;
+        double due = 0;  // on the clock's elapsed time, as what follows
         double started = 0;
         KSDate startDate;
-        bool running = false;
+        ActivityBlock block = nullptr;
 
-        bool isIdle() const { return block && criteria.periodSeconds > 0 && !running; }
+        bool isIdle() const { return registered && criteria.periodSeconds > 0 && !running; }
     };
 
-    Activity* find(std::string_view identifier);
-    bool lacksPower(const Activity& activity) const {
-        return activity.criteria.requireExternalPower && !externalPower_;
+    template <class Activities>
+    static auto find(Activities& activities, std::string_view identifier) {
+        return std::ranges::find_if(activities, [&](const Activity& activity) {
+            return activity.criteria.identifier == identifier;
+        });
     }
+    bool lacksPower(const Activity& activity) const {
+        return activity.criteria.requireExternalPower && !power_.hasExternalPower();
+    }
+    void reconsider();
     void startWhatIsDue();
     void start(Activity& activity);
     void ended(const std::string& identifier, bool finished);
-    std::string describe(const Activity& activity) const;
+    std::string stateOf(const Activity& activity) const;
     void readStateFile();
     void writeStateFile();
 
     Clock& clock_;
+    PowerSources& power_;
     const std::filesystem::path stateFile_;
     std::vector<Activity> activities_;
     double settleSeconds_ = kSettleSeconds;
     double secondsBetweenStarts_ = kSecondsBetweenStarts;
     double earliestStart_ = 0;
-    bool externalPower_ = true;
     bool stopped_ = false;
     bool writeFailed_ = false;
     Timer timer_;
+    Observation powerChanges_;
+
+    mutable std::mutex mutex_;
+    std::vector<Activity> shown_;  // under mutex_: the activities as of the last change
+
     WorkQueue queue_{"ActivityTimers"};
 };
 
-ActivityTimers::State::State(Clock& clock, std::vector<ActivityCriteria> criteria,
+ActivityTimers::State::State(Clock& clock, PowerSources& power,
+                             std::vector<ActivityCriteria> criteria,
                              std::filesystem::path stateFile)
-    : clock_(clock), stateFile_(std::move(stateFile)) {
+    : clock_(clock), power_(power), stateFile_(std::move(stateFile)) {
     for (auto& one : criteria) {
         if (one.periodSeconds > 0) {
             settleSeconds_ = std::min(settleSeconds_, one.periodSeconds);
@@ -121,24 +138,17 @@ ActivityTimers::State::State(Clock& clock, std::vector<ActivityCriteria> criteri
         activities_.push_back({.criteria = std::move(one)});
     }
     readStateFile();
-}
-
-ActivityTimers::State::Activity* ActivityTimers::State::find(std::string_view identifier) {
-    const auto found = std::ranges::find_if(activities_, [&](const Activity& activity) {
-        return activity.criteria.identifier == identifier;
-    });
-    return found == activities_.end() ? nullptr : &*found;
+    powerChanges_ = power_.observeExternalPower(queue_, [this] { reconsider(); });
 }
 
 void ActivityTimers::State::add(std::string_view identifier, ActivityBlock block) {
-    auto* activity = find(identifier);
-    if (!activity) {
+    const auto activity = find(activities_, identifier);
+    if (activity == activities_.end()) {
         logError(fmt::format("no times are declared for the activity {}", identifier));
         return;
     }
-    if (!assertParameter(!activity->block, "the activity is not registered yet", kUnit, __LINE__)) {
-        return;
-    }
+    if (!assertParameter(!activity->registered, "!activity.registered", kUnit, __LINE__)) return;
+    activity->registered = true;
     activity->block = std::move(block);
     const double period = activity->criteria.periodSeconds;
     double remaining = 0;
@@ -147,12 +157,24 @@ void ActivityTimers::State::add(std::string_view identifier, ActivityBlock block
         remaining = std::clamp(*activity->lastStart + period - clock_.now(), 0.0, period);
     }
     activity->due = clock_.elapsed() + std::max(remaining, settleSeconds_);
-    startWhatIsDue();
+    reconsider();
 }
 
 void ActivityTimers::State::remove(std::string_view identifier) {
-    auto* activity = find(identifier);
-    if (activity) activity->block = nullptr;
+    const auto activity = find(activities_, identifier);
+    if (activity == activities_.end()) return;
+    activity->registered = false;
+    activity->block = nullptr;
+    reconsider();
+}
+
+/// After every change.
+void ActivityTimers::State::reconsider() {
+    startWhatIsDue();
+    auto copy = activities_;
+    for (auto& activity : copy) activity.block = nullptr;
+    const std::lock_guard lock(mutex_);
+    shown_ = std::move(copy);
 }
 
 void ActivityTimers::State::startWhatIsDue() {
@@ -168,7 +190,7 @@ void ActivityTimers::State::startWhatIsDue() {
     if (!next) return;
     const double begin = std::max(next->due, earliestStart_);
     if (begin > now) {
-        timer_ = clock_.afterElapsed(queue_, begin - now, [this] { startWhatIsDue(); });
+        timer_ = clock_.afterElapsed(queue_, begin - now, [this] { reconsider(); });
         return;
     }
     earliestStart_ = now + secondsBetweenStarts_;
@@ -191,7 +213,7 @@ void ActivityTimers::State::start(Activity& activity) {
 }
 
 void ActivityTimers::State::ended(const std::string& identifier, bool finished) {
-    auto& activity = *find(identifier);
+    auto& activity = *find(activities_, identifier);
     activity.running = false;
     const double now = clock_.elapsed();
     const double period = activity.criteria.periodSeconds;
@@ -202,44 +224,37 @@ void ActivityTimers::State::ended(const std::string& identifier, bool finished) 
         activity.lastStart = activity.startDate;
         writeStateFile();
     }
-    startWhatIsDue();
+    reconsider();
 }
 
 void ActivityTimers::State::stop() {
     stopped_ = true;
     timer_.cancel();
+    powerChanges_ = nullptr;
 }
 
-void ActivityTimers::State::setExternalPower(bool connected) {
-    if (std::exchange(externalPower_, connected) != connected) startWhatIsDue();
-}
-
-std::string ActivityTimers::State::describe(const Activity& activity) const {
+std::string ActivityTimers::State::stateOf(const Activity& activity) const {
+    if (!activity.registered) return "not registered";
     const double now = clock_.elapsed();
     if (activity.running) return "running for " + durationText(now - activity.started);
     if (activity.criteria.periodSeconds <= 0) return "off";
-    if (stopped_) return "stopped";
-    const double until = std::max(activity.due, earliestStart_) - now;
-    if (activity.due <= now && lacksPower(activity)) {
-        return fmt::format("due for {}, waiting for external power",
-                           durationText(now - activity.due));
-    }
-    return fmt::format("due in {}", durationText(until));
+    if (activity.due > now) return "due in " + durationText(activity.due - now);
+    return fmt::format("due for {}{}", durationText(now - activity.due),
+                       lacksPower(activity) ? ", waiting for external power" : "");
 }
 
-std::vector<std::string> ActivityTimers::State::describe() const {
-    std::vector<std::string> lines;
-    for (const auto& activity : activities_) {
-        if (!activity.block) continue;
-        const auto& [identifier, period, power] = activity.criteria;
-        std::string line = fmt::format("{}: {}", identifier, describe(activity));
-        if (period > 0) line += fmt::format("; every {}", durationText(period));
-        if (period > 0 && power) line += " on external power";
-        line += activity.lastStart ? "; last run " + formatISO8601(*activity.lastStart)
-                                   : std::string("; no run yet");
-        lines.push_back(std::move(line));
+std::string ActivityTimers::State::describe(std::string_view identifier) const {
+    const std::lock_guard lock(mutex_);
+    const auto found = find(shown_, identifier);
+    if (found == shown_.end()) return fmt::format("{}: not declared", identifier);
+    const auto& criteria = found->criteria;
+    auto line = fmt::format("{}: {}", identifier, stateOf(*found));
+    if (criteria.periodSeconds > 0) {
+        line += fmt::format("; every {}{}", durationText(criteria.periodSeconds),
+                            criteria.requireExternalPower ? " on external power" : "");
     }
-    return lines;
+    return line + (found->lastStart ? "; last run " + formatISO8601(*found->lastStart)
+                                    : std::string("; no run yet"));
 }
 
 void ActivityTimers::State::readStateFile() {
@@ -270,9 +285,10 @@ void ActivityTimers::State::writeStateFile() {
     writeFailed_ = error.has_value();
 }
 
-ActivityTimers::ActivityTimers(Clock& clock, std::vector<ActivityCriteria> criteria,
+ActivityTimers::ActivityTimers(Clock& clock, PowerSources& power,
+                               std::vector<ActivityCriteria> criteria,
                                std::filesystem::path stateFile)
-    : state_(std::make_shared<State>(clock, std::move(criteria), std::move(stateFile))) {}
+    : state_(std::make_shared<State>(clock, power, std::move(criteria), std::move(stateFile))) {}
 
 ActivityTimers::~ActivityTimers() { stop(); }
 
@@ -289,18 +305,12 @@ ActivityRegistration ActivityTimers::schedulePreregistered(std::string_view iden
     });
 }
 
-std::vector<std::string> ActivityTimers::describe() const {
-    std::vector<std::string> lines;
-    state_->queue().sync([this, &lines] { lines = state_->describe(); });
-    return lines;
+std::string ActivityTimers::describe(std::string_view identifier) const {
+    return state_->describe(identifier);
 }
 
 void ActivityTimers::stop() {
     state_->queue().sync([this] { state_->stop(); });
-}
-
-void ActivityTimers::setExternalPower(bool connected) {
-    state_->queue().async([state = state_, connected] { state->setExternalPower(connected); });
 }
 
 }  // namespace keepsakes

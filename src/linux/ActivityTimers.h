@@ -6,13 +6,12 @@
 #include <string>
 #include <vector>
 
-#include "core/KSDate.h"
-#include "core/WorkQueue.h"
 #include "platform/BackgroundActivities.h"
 
 namespace keepsakes {
 
 class Clock;
+class PowerSources;
 
 /// When an activity runs.
 struct ActivityCriteria {
@@ -23,7 +22,7 @@ struct ActivityCriteria {
 
 /// Starts each activity once a period, by one timer that is armed for the next one due and nothing
 /// between. Any thread may call it; blocks run on its queue. Owned by the composition root;
-/// outlives the services, and the clock outlives it.
+/// outlives the services, and the clock and the power sources outlive it.
 ///
 /// A period is elapsed time, the time asleep included: "24h" is 24 hours on days of 23 and of 25 as
 /// well, and setting the clock moves nothing while the daemon runs. What came due during sleep
@@ -36,13 +35,14 @@ struct ActivityCriteria {
 /// half a minute of each other, after waking or when the charger comes as well. Where a period is
 /// so short that these waits would stretch it, they shrink.
 ///
+/// What requires external power and lacks it when its time comes begins when the charger is there.
 /// A run that is given up is not kept: it is due again a period later, or soon after a restart.
 class ActivityTimers final : public BackgroundActivities {
   public:
     static constexpr double kSettleSeconds = 60;
     static constexpr double kSecondsBetweenStarts = 30;
 
-    ActivityTimers(Clock& clock, std::vector<ActivityCriteria> criteria,
+    ActivityTimers(Clock& clock, PowerSources& power, std::vector<ActivityCriteria> criteria,
                    std::filesystem::path stateFile);
     ~ActivityTimers() override;
     ActivityTimers(const ActivityTimers&) = delete;
@@ -50,12 +50,8 @@ class ActivityTimers final : public BackgroundActivities {
 
     ActivityRegistration schedulePreregistered(std::string_view identifier,
                                                ActivityBlock block) override;
-    std::vector<std::string> describe() const override;
+    std::string describe(std::string_view identifier) const override;
     void stop() override;
-
-    /// Whether the device has external power, as it does until somebody says otherwise. What waited
-    /// for it starts when it comes.
-    void setExternalPower(bool connected);
 
   private:
     class State;

@@ -6,7 +6,6 @@
 #include <string>
 #include <string_view>
 #include <utility>
-#include <vector>
 
 namespace keepsakes {
 
@@ -49,8 +48,9 @@ class BackgroundActivities {
     [[nodiscard]] virtual ActivityRegistration schedulePreregistered(std::string_view identifier,
                                                                      ActivityBlock block) = 0;
 
-    /// A line for each registered activity: when it is due, running or waiting for power.
-    virtual std::vector<std::string> describe() const = 0;
+    /// One line on an activity: when it is due, whether it runs or waits for power, when it ran
+    /// last. Waits for nothing.
+    virtual std::string describe(std::string_view identifier) const = 0;
 
     /// Begins no activity from now on. For shutdown.
     virtual void stop() = 0;

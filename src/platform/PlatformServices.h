@@ -15,7 +15,9 @@ class DevicePolicy;
 class HealthStore;
 class LockState;
 class PhotoAnalysis;
+class PowerSources;
 class Problems;
+class SystemNotifications;
 class UserDefaults;
 
 /// What the daemon may do by itself; fixed at start by the owner's diagnostics policy.
@@ -33,6 +35,8 @@ struct PlatformServices {
     Clock* clock = nullptr;
     DevicePolicy* devicePolicy = nullptr;
     LockState* lockState = nullptr;
+    PowerSources* powerSources = nullptr;
+    SystemNotifications* systemNotifications = nullptr;
     UserDefaults* userDefaults = nullptr;
     AnalyticsService* analytics = nullptr;
     HealthStore* healthStore = nullptr;

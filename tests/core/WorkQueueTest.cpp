@@ -131,6 +131,32 @@ TEST(Clock, TimeAsleepCountsOnlyWhereItIsAskedFor) {
     EXPECT_THAT(seen, ElementsAre("elapsed", "awake"));
 }
 
+TEST(WorkQueue, TellsWhatEachQueueIsDoing) {
+    const auto reportOf = [](std::string_view label) {
+        auto reports = WorkQueue::reports();
+        std::erase_if(reports, [label](const auto& report) { return report.label != label; });
+        return reports;
+    };
+    {
+        WorkQueue queue("a queue of the report");
+        Semaphore gate;
+        Semaphore begun;
+        queue.async([gate, begun]() mutable {
+            begun.signal();
+            gate.wait();
+        });
+        queue.async([] {});
+        begun.wait();
+        const auto busy = reportOf(queue.label());
+        gate.signal();
+        ASSERT_EQ(busy.size(), 1u);
+        EXPECT_TRUE(busy[0].isRunning);
+        EXPECT_EQ(busy[0].waiting, 1u);
+    }
+    WorkerThreads::shared().settle();
+    EXPECT_TRUE(reportOf("a queue of the report").empty());
+}
+
 TEST(Clock, AWaitEndsWithTheSignalOrTheTime) {
     VirtualClock clock;
     WorkQueue queue("q");

@@ -5,10 +5,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <fstream>
 #include <map>
 
 #include "core/Clock.h"
+#include "support/FakeDeviceState.h"
 #include "support/TemporaryFolder.h"
 #include "support/VirtualClock.h"
 
@@ -28,7 +28,7 @@ class Activities : public testing::Test {
     void start(std::vector<ActivityCriteria> criteria) {
         end();
         begun = clock.elapsed();
-        timers = std::make_unique<ActivityTimers>(clock, criteria, file);
+        timers = std::make_unique<ActivityTimers>(clock, power, criteria, file);
         for (const auto& one : criteria) {
             registrations.push_back(timers->schedulePreregistered(
                 one.identifier, [this, name = one.identifier](const auto& run) {
@@ -60,6 +60,7 @@ class Activities : public testing::Test {
     TemporaryFolder folder;
     const std::filesystem::path file = folder / "state/activities.plist";
     VirtualClock clock;
+    FakePowerSources power;
     bool holds = false;
     double begun = 0;
     std::map<std::string, std::shared_ptr<ActivityRun>> held;
@@ -127,7 +128,7 @@ TEST_F(Activities, ARunThatOutlastsItsPeriodIsNotStartedTwice) {
     holds = true;
     start({{"a", kHour}, {"b", kHour}});
     EXPECT_THAT(startsDuring(2.5 * kHour), ElementsAre("a 60", "b 90"));
-    EXPECT_THAT(timers->describe().at(0), HasSubstr("a: running for 2 h 29 min"));
+    EXPECT_THAT(timers->describe("a"), HasSubstr("a: running for 2 h 29 min"));
     held["a"]->finish();
     held["a"]->finish();
     EXPECT_THAT(startsDuring(kHour), ElementsAre("a 10860")) << "the periods passed over are lost";
@@ -139,18 +140,17 @@ TEST_F(Activities, ARunThatOutlastsItsPeriodIsNotStartedTwice) {
 
 TEST_F(Activities, WaitForTheChargerAndBeginWhenItComes) {
     start({{"a", kHour, true}, {"b", kHour, true}, {"c", kHour}});
-    timers->setExternalPower(false);
+    power.setExternalPower(false);
     EXPECT_THAT(startsDuring(kHour), ElementsAre("c 60"));
-    EXPECT_THAT(timers->describe().at(0),
+    EXPECT_THAT(timers->describe("a"),
                 testing::StartsWith("a: due for 59 min, waiting for external power; every 1 h on "
                                     "external power; no run yet"));
-    timers->setExternalPower(false);
     EXPECT_THAT(startsDuring(1), IsEmpty());
-    timers->setExternalPower(true);
+    power.setExternalPower(true);
     EXPECT_THAT(startsDuring(60), ElementsAre("a 3601", "b 3631", "c 3661"));
-    EXPECT_THAT(timers->describe(),
-                ElementsAre(HasSubstr("a: due in 59 min"), HasSubstr("b: due in 59 min"),
-                            testing::MatchesRegex("c: due in 1 h; every 1 h; last run 20.*Z")));
+    EXPECT_THAT(timers->describe("b"), HasSubstr("b: due in 59 min"));
+    EXPECT_THAT(timers->describe("c"),
+                testing::MatchesRegex("c: due in 1 h; every 1 h; last run 20.*Z"));
 }
 
 TEST_F(Activities, ShortPeriodsAreKept) {
@@ -180,7 +180,7 @@ TEST_F(Activities, ABlockDoesNotRunOnceItsRegistrationEnded) {
     start({{"a", kHour}, {"b", kHour}});
     registrations.pop_back();
     EXPECT_THAT(startsDuring(100), ElementsAre("a 60"));
-    EXPECT_THAT(timers->describe(), ElementsAre(HasSubstr("a: due in")));
+    EXPECT_THAT(timers->describe("b"), HasSubstr("b: not registered"));
     const auto unknown = timers->schedulePreregistered("x", [](const auto&) { FAIL(); });
     clock.advance(kDay);
 }

@@ -178,6 +178,8 @@ TestPlatform::TestPlatform() {
     services.clock = &clock;
     services.devicePolicy = &policy;
     services.lockState = &lock;
+    services.powerSources = &power;
+    services.systemNotifications = &notifications;
     services.userDefaults = &defaults;
     services.analytics = &analytics;
     services.healthStore = &health;

@@ -16,11 +16,12 @@
 #include "platform/AnalyticsService.h"
 #include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
-#include "platform/DeviceState.h"
 #include "platform/HealthStore.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
+#include "platform/SystemNotifications.h"
 #include "platform/UserDefaults.h"
+#include "support/FakeDeviceState.h"
 #include "support/TemporaryFolder.h"
 #include "support/VirtualClock.h"
 
@@ -89,22 +90,6 @@ class FakeDefaults final : public UserDefaults {
                             const KSValue& value) override;
 };
 
-class FakeLockState final : public LockState {
-  public:
-    bool protects = false;
-    bool unlocked = false;
-    int current = 0;
-    bool formattedForContentProtection() const override { return protects; }
-    bool unlockedSinceBoot() const override { return unlocked; }
-    int currentState() const override { return current; }
-};
-
-class FakeDevicePolicy final : public DevicePolicy {
-  public:
-    bool diagnosticSubmissionAllowed() const override { return true; }
-    bool healthDataSubmissionAllowed() const override { return true; }
-};
-
 class FakeDeviceData final : public DeviceDataIndex {
   public:
     ScanReport report;
@@ -125,7 +110,7 @@ class FakeActivities final : public BackgroundActivities {
 
     ActivityRegistration schedulePreregistered(std::string_view identifier,
                                                ActivityBlock block) override;
-    std::vector<std::string> describe() const override { return {}; }
+    std::string describe(std::string_view) const override { return "fired by the test"; }
     void stop() override {}
 
   private:
@@ -148,6 +133,8 @@ struct TestPlatform {
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
+    FakePowerSources power;
+    SystemNotifications notifications;
     FakeDevicePolicy policy;
     FakeDeviceData deviceData;
     FakeActivities activities;

@@ -32,6 +32,10 @@ std::shared_ptr<KSEventCollectionScheduler> KSEventCollectionScheduler::initWith
         universe.platform(), std::move(eventManager), collectEnabled));
 }
 
+std::vector<std::string> KSEventCollectionScheduler::diagnosticLines() const {
+    return scheduleLines(platform_, kActivity, collectEnabled_);
+}
+
 void KSEventCollectionScheduler::run(const std::shared_ptr<ActivityRun>& activity) {
     if (!collectEnabled_) return;
     const auto run = std::make_shared<ScheduledRun>("ScheduledCollectEvent", platform_, activity);

@@ -2,7 +2,9 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/ServiceLookup.h"
 #include "platform/BackgroundActivities.h"
@@ -26,6 +28,8 @@ class KSEventCollectionScheduler final : public KSService {
         const ServiceLookup& universe, bool collectEnabled);
 
     const std::shared_ptr<KSDaemonSPINotifier>& notifier() const { return notifier_; }
+
+    std::vector<std::string> diagnosticLines() const override;
 
   private:
     KSEventCollectionScheduler(const PlatformServices& platform,

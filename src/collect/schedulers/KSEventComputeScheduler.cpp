@@ -41,6 +41,10 @@ std::shared_ptr<KSEventComputeScheduler> KSEventComputeScheduler::initWithUniver
         universe.platform(), std::move(eventManager), std::move(bundleManager), computeEnabled));
 }
 
+std::vector<std::string> KSEventComputeScheduler::diagnosticLines() const {
+    return scheduleLines(platform_, kActivity, computeEnabled_);
+}
+
 void KSEventComputeScheduler::run(const std::shared_ptr<ActivityRun>& activity) {
     if (!computeEnabled_) return;
     const auto run = std::make_shared<ScheduledRun>("ScheduledComputeEvent", platform_, activity);

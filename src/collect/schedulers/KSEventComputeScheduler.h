@@ -2,7 +2,9 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/ServiceLookup.h"
 #include "core/WorkQueue.h"
@@ -30,6 +32,8 @@ class KSEventComputeScheduler final : public KSService {
                                                                      bool computeEnabled);
 
     const std::shared_ptr<KSDaemonSPINotifier>& notifier() const { return notifier_; }
+
+    std::vector<std::string> diagnosticLines() const override;
 
   private:
     KSEventComputeScheduler(const PlatformServices& platform,

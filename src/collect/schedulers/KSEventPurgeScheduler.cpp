@@ -59,6 +59,10 @@ std::shared_ptr<KSEventPurgeScheduler> KSEventPurgeScheduler::initWithUniverse(
         universe.platform(), std::move(eventManager), std::move(bundleManager), purgeEnabled));
 }
 
+std::vector<std::string> KSEventPurgeScheduler::diagnosticLines() const {
+    return scheduleLines(platform_, kActivity, purgeEnabled_);
+}
+
 void KSEventPurgeScheduler::run(const std::shared_ptr<ActivityRun>& activity) {
     logInfo(fmt::format("{} completionHandler", kActivity));
     if (!purgeEnabled_) return;

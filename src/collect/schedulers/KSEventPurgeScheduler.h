@@ -2,7 +2,9 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/ServiceLookup.h"
 #include "core/WorkQueue.h"
@@ -29,6 +31,8 @@ class KSEventPurgeScheduler final : public KSService {
                                                                    bool purgeEnabled);
 
     const std::shared_ptr<KSDaemonSPINotifier>& notifier() const { return notifier_; }
+
+    std::vector<std::string> diagnosticLines() const override;
 
   private:
     KSEventPurgeScheduler(const PlatformServices& platform,

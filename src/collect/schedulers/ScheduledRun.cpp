@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "schedulers/ScheduledRun.h"
 
-#include <string>
 #include <utility>
 
 #include "core/ResultKeys.h"
@@ -28,6 +27,13 @@ KSDictionary triggerPayload(KSDictionary result, const OptionalError& error) {
     if (error) result.insert_or_assign(std::string(kResultOverallSuccess), false);
     result.insert_or_assign(std::string(kTriggerSource), kTriggeredByTheSystem);
     return result;
+}
+
+std::vector<std::string> scheduleLines(const PlatformServices& platform, std::string_view activity,
+                                       bool enabled) {
+    auto line = platform.activities->describe(activity);
+    if (!enabled) line += "; switched off with diagnostics";
+    return {std::move(line)};
 }
 
 }  // namespace keepsakes

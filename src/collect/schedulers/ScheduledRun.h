@@ -2,7 +2,9 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/KSError.h"
 #include "notify/KSWatchDog.h"
@@ -29,5 +31,9 @@ struct ScheduledRun {
 /// What a scheduler's notification tells: the result, its trigger "bootd", and the overall success
 /// as false when there was an error.
 KSDictionary triggerPayload(KSDictionary result, const OptionalError& error);
+
+/// What a scheduler says of its schedule in a diagnostic report.
+std::vector<std::string> scheduleLines(const PlatformServices& platform, std::string_view activity,
+                                       bool enabled);
 
 }  // namespace keepsakes
