@@ -3,13 +3,16 @@
 
 #include <fmt/format.h>
 
+#include <functional>
 #include <ranges>
 #include <utility>
 
+#include "bundle/BundleRules.h"
 #include "bundle/KSEventBundleManager.h"
 #include "bundle/KSEventBundleStore.h"
 #include "collect/KSEventManager.h"
 #include "core/KSAssertion.h"
+#include "metrics/UsageMetrics.h"
 #include "notify/KSDaemonSPINotifier.h"
 #include "notify/KSTocsinNotifier.h"
 #include "platform/PlatformServices.h"
@@ -29,6 +32,14 @@ namespace {
 
 constexpr double kDisabledLifeSeconds = 10;
 
+KSEventBundleManager::MetricsObserver usageMetricsOf(const ServiceLookup& universe) {
+    std::vector<std::string> ruleNames;
+    for (const auto& rule : predicatesOfDesiredExperiences()) ruleNames.emplace_back(rule.name);
+    const auto metrics = UsageMetrics::initWithUniverse(universe, std::move(ruleNames));
+    return {std::bind_front(&UsageMetrics::submitMetricForEventBundle, metrics),
+            std::bind_front(&UsageMetrics::submitKSEventData, metrics)};
+}
+
 }  // namespace
 
 KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
@@ -42,7 +53,9 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
     add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));
     add("EventManager", KSEventManager::initWithUniverse(*this));
-    add("EventBundleManager", KSEventBundleManager::initWithUniverse(*this));
+    const auto bundleManager = KSEventBundleManager::initWithUniverse(*this);
+    add("EventBundleManager", bundleManager);
+    bundleManager->setMetricsObserver(usageMetricsOf(*this));
     const auto server = KSManageServer::initWithUniverse(*this);
     add("Server", server);
     add("DaemonClientNotifier", server->getNotifier());
