@@ -196,38 +196,6 @@ int showBundles(const Console& console, const FetchWords& words) {
     return console.print(text + counted(bundles->size(), "bundle") + "\n");
 }
 
-int showTrends(const Console& console, const std::string& file) {
-    KSEventArray events;
-    if (!file.empty()) {
-        const auto text = readInput(file);
-        if (!text) return console.fail(text.error());
-        auto given = eventsFromJson(*text);
-        if (!given) return console.fail(given.error());
-        events = std::move(*given);
-    }
-    const auto client = console.connect();
-    if (!client) return console.fail(client.error());
-    if (file.empty()) {
-        KSEventFetchOptions options;
-        options.ascending = true;
-        auto stored = (*client)->fetchEventsWithOptions(options);
-        if (!stored) return console.fail(stored.error());
-        events = std::move(*stored);
-    }
-    const auto trends = (*client)->analyzeTrendsInEvents(events);
-    console.endProgress();
-    if (!trends) return console.fail(trends.error());
-    if (console.json()) return console.print(jsonRecords(*trends));
-    Table table({"Start", "Category", "Details", "Trends"});
-    for (const auto& event : *trends) {
-        const auto found = jsonText(jsonForm(KSValue(event->trends.value_or(KSDictionary()))));
-        table.add({shown(event->startDate()), event->describeCategory(), detailsOf(*event),
-                   found.value_or("")});
-    }
-    return console.print((trends->empty() ? "" : table.text(console.screen())) +
-                         counted(trends->size(), "event") + "\n");
-}
-
 int doWork(const Console& console, Work work) {
     const auto client = console.connect();
     if (!client) return console.fail(client.error());

@@ -8,6 +8,15 @@
 
 namespace keepsakes {
 
+namespace {
+
+/// A trends event has the category of what it tells of, and no source.
+bool hasNoSource(const KSEventArray& group) {
+    return group.front()->provider() == KSEventProvider::postAnalytics;
+}
+
+}  // namespace
+
 EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")) {
@@ -29,6 +38,10 @@ EventSources::EventSources(const ServiceLookup& universe)
 
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
                                                      ResultHandler handler) const {
+    if (hasNoSource(group)) {
+        handler(std::nullopt, {});
+        return;
+    }
     switch (group.front()->category()) {
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
@@ -44,6 +57,10 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
 
 void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
                                                   EventsHandler handler) const {
+    if (hasNoSource(group)) {
+        handler(group, std::nullopt);
+        return;
+    }
     switch (group.front()->category()) {
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {

@@ -29,6 +29,9 @@ class EventSources {
 
     explicit EventSources(const ServiceLookup& universe);
 
+    /// Who answers for the owner's age and sex; may be missing.
+    const std::shared_ptr<KSVitalsManager>& vitalsManager() const { return vitalsManager_; }
+
     /// In the order of collection.
     const std::vector<CollectionStep>& collectionSteps() const { return steps_; }
 

@@ -7,6 +7,7 @@
 #include <ranges>
 #include <utility>
 
+#include "analytics/KSDaemonAnalyticsManager.h"
 #include "bundle/BundleRules.h"
 #include "bundle/KSEventBundleManager.h"
 #include "bundle/KSEventBundleStore.h"
@@ -70,6 +71,7 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     const auto purge = KSEventPurgeScheduler::initWithUniverse(*this, switches.purgeEnabled);
     add("EventPurgeScheduler", purge);
     add("EventPurgeSchedulerNotifier", purge->notifier());
+    add("DaemonAnalytics", KSDaemonAnalyticsManager::initWithUniverse(*this));
 }
 
 KSDaemonUniverse::~KSDaemonUniverse() {

@@ -262,8 +262,9 @@ void ActivityTimers::State::readStateFile() {
     if (!kept) {
         const auto& error = kept.error();
         if (error.domain == kPosixErrorDomain && error.code == ENOENT) return;
-        logWarning(fmt::format("the times of the last runs are lost: {} ({})", error.description(),
-                               stateFile_.string()));
+        const bool namesFile = error.domain == kPosixErrorDomain;
+        logWarning(fmt::format("the times of the last runs are lost: {}{}", error.description(),
+                               namesFile ? "" : " in " + stateFile_.string()));
         return;
     }
     for (auto& activity : activities_) {

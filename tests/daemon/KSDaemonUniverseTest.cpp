@@ -17,13 +17,14 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
     RecordedAssertions assertions;
     const KSDaemonUniverse universe(platform.services);
     EXPECT_THAT(assertions.take(), ElementsAre());
-    EXPECT_THAT(universe.serviceNames(),
-                ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore",
-                            "EventStore", "PhotoManager", "VitalsManager", "DefaultsManager",
-                            "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier",
-                            "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
-                            "EventComputeScheduler", "EventComputeSchedulerNotifier",
-                            "EventPurgeScheduler", "EventPurgeSchedulerNotifier"));
+    EXPECT_THAT(
+        universe.serviceNames(),
+        ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
+                    "PhotoManager", "VitalsManager", "DefaultsManager", "EventManager",
+                    "EventBundleManager", "Server", "DaemonClientNotifier",
+                    "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
+                    "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
+                    "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;
         EXPECT_EQ(universe.getService(name), universe.getService(name));

@@ -75,7 +75,8 @@ TEST_F(Schedulers, EachAnnouncesWhatItDidAndThenReportsTheActivityFinished) {
                             R"("triggerSource": "bootd"})"));
     EXPECT_THAT(
         fire(kCompute),
-        UnorderedElementsAre(R"(5 {"resultOverallSuccess": false, "triggerSource": "bootd"})",
+        UnorderedElementsAre(R"(5 {"resultNumberOfEvents": 0, "stateDatabaseAvailable": true, )"
+                             R"("triggerSource": "bootd"})",
                              R"(3 {"resultNumberOfBundleEvents": 1, "resultNumberOfEvents": 1, )"
                              R"("stateDatabaseAvailable": true, "triggerSource": "bootd"})"));
     const auto event = makeWorkout(1, 10, 20, "Running");
