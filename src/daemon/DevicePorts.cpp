@@ -11,6 +11,7 @@
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "devicedata/MediaStreamFile.h"
+#include "linux/ActivityTimers.h"
 #include "linux/AnalyticsLog.h"
 #include "linux/BusThread.h"
 #include "linux/IndexerProcess.h"
@@ -92,6 +93,13 @@ std::unique_ptr<MediaWatcher> mediaWatcher(bool wanted, MediaStreamFile& stream,
     return nullptr;
 }
 
+std::vector<ActivityCriteria> activityCriteria(const Configuration& configuration) {
+    const auto& set = configuration.activities;
+    return {{"com.brindle.keepsakesd.eventCollection", set.collection, set.requireExternalPower},
+            {"com.brindle.keepsakesd.eventCompute", set.compute, set.requireExternalPower},
+            {"com.brindle.keepsakesd.eventPurge", set.purge, set.requireExternalPower}};
+}
+
 }  // namespace
 
 struct DevicePorts::Adapters {
@@ -107,6 +115,7 @@ struct DevicePorts::Adapters {
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
+          activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
           memory(*clock),
           watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {
@@ -128,6 +137,7 @@ struct DevicePorts::Adapters {
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
     IndexerProcess deviceData;
+    ActivityTimers activities;
     MediaStreamFile media;
     MemoryRelease memory;
     std::unique_ptr<MediaWatcher> watcher;
@@ -148,6 +158,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.photoAnalysis = &adapters_->photos;
     services_.nowPlayingStream = &adapters_->media;
     services_.deviceData = &adapters_->deviceData;
+    services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;
     services_.requestEnded = [adapters = adapters_.get()] { adapters->memory.soon(); };
     services_.cacheFolder = folders.cache;

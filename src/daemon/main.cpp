@@ -21,6 +21,7 @@
 #include "daemon/MainLoop.h"
 #include "daemon/ProgressReport.h"
 #include "linux/FileWatch.h"
+#include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/DeviceState.h"
 #include "store/KSPersistenceManager.h"
@@ -134,6 +135,7 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     // First what feeds the services, then they themselves.
     const auto limit = limitOnEnding(*services.clock, endQueue);
     (*listener)->invalidate();
+    services.activities->stop();
     services.deviceData->stop();
     WorkerThreads::shared().settle();
     report.reset();

@@ -7,6 +7,7 @@
 namespace keepsakes {
 
 class AnalyticsService;
+class BackgroundActivities;
 class BusListener;
 class Clock;
 class DeviceDataIndex;
@@ -43,6 +44,7 @@ struct PlatformServices {
     PhotoAnalysis* photoAnalysis = nullptr;
     NowPlayingStream* nowPlayingStream = nullptr;
     DeviceDataIndex* deviceData = nullptr;
+    BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;
     Problems* problems = nullptr;
     /// The daemon's folder for the database and its property lists; made when missing.

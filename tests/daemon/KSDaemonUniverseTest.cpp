@@ -21,7 +21,10 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
         universe.serviceNames(),
         ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
                     "PhotoManager", "VitalsManager", "NowPlayingMediaManager", "DefaultsManager",
-                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier"));
+                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier",
+                    "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
+                    "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
+                    "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;
         EXPECT_EQ(universe.getService(name), universe.getService(name));

@@ -14,6 +14,7 @@
 #include "core/ServiceLookup.h"
 #include "core/WorkQueue.h"
 #include "platform/AnalyticsService.h"
+#include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/HealthStore.h"
 #include "platform/MediaStream.h"
@@ -110,6 +111,27 @@ class FakeDeviceData final : public DeviceDataIndex {
     void stop() override {}
 };
 
+/// Activities that start when the test says so, on a queue of their own.
+class FakeActivities final : public BackgroundActivities {
+  public:
+    /// Starts a run; false when nothing is registered under the identifier.
+    bool fire(const std::string& identifier);
+    /// "<identifier> <finished or given up>" of each run that ended; forgets them.
+    std::vector<std::string> takeEnds();
+    std::vector<std::string> registered() const;
+
+    ActivityRegistration schedulePreregistered(std::string_view identifier,
+                                               ActivityBlock block) override;
+    std::string describe(std::string_view) const override { return "fired by the test"; }
+    void stop() override {}
+
+  private:
+    mutable std::mutex mutex_;
+    std::map<std::string, ActivityBlock> blocks_;
+    std::vector<std::string> ends_;
+    WorkQueue queue_{"FakeActivities"};
+};
+
 /// Everything the daemon needs of a device, in memory, with a folder of its own and a clock that
 /// the test moves.
 struct TestPlatform {
@@ -128,6 +150,7 @@ struct TestPlatform {
     SystemNotifications notifications;
     FakeDevicePolicy policy;
     FakeDeviceData deviceData;
+    FakeActivities activities;
     std::vector<int> exits;
     PlatformServices services;
 };
