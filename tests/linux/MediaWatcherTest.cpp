@@ -46,7 +46,7 @@ class ScriptedPlayer {
 };
 
 /// Time stands at what the test says. Waiting is for the watcher, which handles what players say
-/// in their order; one that never does fails the test after a minute.
+/// in their order; one that never does fails the test
 class Watching : public testing::Test {
   protected:
     void watch() {
@@ -75,7 +75,7 @@ class Watching : public testing::Test {
     /// The next `count` records.
     std::vector<std::string> next(std::size_t count) {
         std::unique_lock lock(mutex);
-        const bool came = changed.wait_for(lock, std::chrono::minutes(1),
+        const bool came = changed.wait_for(lock, std::chrono::seconds(20),
                                            [&] { return records.size() >= count; });
         EXPECT_TRUE(came);
         return std::exchange(records, {});
