@@ -13,6 +13,7 @@
 #include <thread>
 
 #include "client/ConduitClient.h"
+#include "support/MockService.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestEvents.h"
 
@@ -43,6 +44,14 @@ class DaemonProcess : public testing::Test {
 
     void configure(const std::string& deviceData) {
         folder.write("config/keepsakesd/config.toml", "[device_data]\n" + deviceData);
+    }
+
+    /// Waits until the log says so.
+    void waitForLog(const std::string& text) const {
+        while (log().find(text) == std::string::npos) {
+            ASSERT_EQ(waitpid(running, nullptr, WNOHANG), 0) << log();
+            std::this_thread::yield();
+        }
     }
 
     /// Starts a daemon whose log goes to a file; does not wait for it.
@@ -188,6 +197,39 @@ TEST_F(DaemonProcess, ABadConfigurationIsNamedInOneLine) {
     configure("tracks = []\nfotos = []\n");
     EXPECT_EQ(exitStatusOf(start()), 1);
     EXPECT_THAT(log(), MatchesRegex("keepsakesd: [^\n]*config.toml:3: device_data.fotos:[^\n]*\n"));
+}
+
+TEST_F(DaemonProcess, StartsLockedAndOpensTheDatabaseWithTheUnlock) {
+    MockService::useSessionBusAsSystemBus();
+    MockLogind logind;
+    logind.startWithUser();
+    logind.addSession("c1", true, true);
+    configure("tracks = []\nphotos = []\n[device]\ncontent_protection = true\n");
+    startAndConnect();
+    EXPECT_FALSE(client->status()->databaseAvailable);
+    logind.end();
+    logind.startWithUser();
+    logind.addSession("c1", true, true);
+    EXPECT_FALSE(client->status()->databaseAvailable);
+    logind.setLocked("c1", false);
+    while (!client->status()->databaseAvailable) std::this_thread::yield();
+    EXPECT_EQ(end(SIGTERM), 0) << log();
+}
+
+TEST_F(DaemonProcess, ReportsWhatItIsDoingAndThatItsSettingsBroke) {
+    startAndConnect();
+    configure("tracks = []\nphotos = 3\n");
+    waitForLog("config.toml:3: device_data.photos");
+    kill(running, SIGUSR1);
+    waitForLog("report: ends");
+    const auto report = log();
+    for (const auto* text : {"report:   DaemonClientNotifier: nobody listens", "KSEventManager",
+                             "DiagnosticReport: running", "events 0, bundles 0", "problems 1",
+                             "the settings before it stay in force"}) {
+        EXPECT_THAT(report, HasSubstr(text));
+    }
+    EXPECT_EQ(client->status()->problems.size(), 1u);
+    EXPECT_EQ(end(SIGTERM), 0);
 }
 
 }  // namespace
