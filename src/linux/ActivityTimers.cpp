@@ -138,6 +138,7 @@ ActivityTimers::State::State(Clock& clock, PowerSources& power,
         activities_.push_back({.criteria = std::move(one)});
     }
     readStateFile();
+    shown_ = activities_;
     powerChanges_ = power_.observeExternalPower(queue_, [this] { reconsider(); });
 }
 
@@ -151,10 +152,11 @@ void ActivityTimers::State::add(std::string_view identifier, ActivityBlock block
     activity->registered = true;
     activity->block = std::move(block);
     const double period = activity->criteria.periodSeconds;
+    const KSDate now = clock_.now();
     double remaining = 0;
-    // A start in the future means that the clock was set back since.
-    if (activity->lastStart) {
-        remaining = std::clamp(*activity->lastStart + period - clock_.now(), 0.0, period);
+    // A start in the future tells nothing but that the clock was set back since.
+    if (const auto last = activity->lastStart; last && *last <= now) {
+        remaining = *last + period - now;
     }
     activity->due = clock_.elapsed() + std::max(remaining, settleSeconds_);
     reconsider();

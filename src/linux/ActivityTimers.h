@@ -30,8 +30,8 @@ struct ActivityCriteria {
 /// still runs is passed over.
 ///
 /// Across restarts, the starts of finished runs are kept as dates in a property list, so that here
-/// a set clock matters: an activity is due at the latest a period after the start, wherever the
-/// clock went. What is overdue begins a minute after the start; and no two activities start within
+/// a set clock matters; a date in the future counts as none, and no activity waits for longer than
+/// its period. What is overdue begins a minute after the start; and no two activities start within
 /// half a minute of each other, after waking or when the charger comes as well. Where a period is
 /// so short that these waits would stretch it, they shrink.
 ///
