@@ -2,10 +2,13 @@
 // Property: the records do not depend on how the bytes come in, and every workout is a span of
 // believable times. The first two bytes choose the sizes of the blocks.
 #include <algorithm>
+#include <cmath>
 #include <cstdint>
 #include <cstring>
 #include <random>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "Check.h"
 #include "platform/ActivityCatalogue.h"
@@ -26,8 +29,35 @@ ReadBlock inBlocks(std::string_view bytes, std::size_t seed) {
     };
 }
 
+/// What the sink gets, and that it is on earth.
+struct Places final : LocationSink {
+    std::vector<std::pair<double, GeoPoint>> points;
+    std::vector<NamedPlace> named;
+
+    void point(const TrackPoint& point) override {
+        check(limits::isSane(point.time, kFuzzNow.now), "a point has a sane time");
+        points.emplace_back(point.time.seconds, onEarth(point.position));
+    }
+    void visit(StatedVisit) override { check(false, "tracks state no visits"); }
+    void place(NamedPlace place) override {
+        check(!place.name.empty(), "a place has a name");
+        onEarth(place.position);
+        named.push_back(std::move(place));
+    }
+    static GeoPoint onEarth(GeoPoint position) {
+        check(std::abs(position.latitude) <= 90 && std::abs(position.longitude) <= 180,
+              "a position is on earth");
+        return position;
+    }
+    friend bool operator==(const Places& a, const Places& b) {
+        return a.points == b.points && a.named == b.named;
+    }
+};
+
 constexpr std::string_view kSeeds[] = {
-    "<gpx><trk><type>hiking</type><trkseg><trkpt lat=\"47\" lon=\"15\"><time>2024-06-15T10:00:00"
+    "<gpx><wpt lat=\"47.05\" "
+    "lon=\"15.4\"><name>Home</name></wpt><trk><type>hiking</type><trkseg><trkpt lat=\"47\" "
+    "lon=\"15\"><time>2024-06-15T10:00:00"
     "+02:00</time></trkpt><trkpt lat=\"47.1\" lon=\"15\"><time>2024-06-15T10:04:00Z</time></trkpt>"
     "</trkseg></trk></gpx>",
     "<TrainingCenterDatabase><Activities><Activity Sport=\"Other\"><Lap StartTime=\"2024-06-12T16:"
@@ -57,14 +87,18 @@ extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t s
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     if (size < 2) return 0;
     const std::string bytes(data + 2, data + size);
-    const auto whole = readTrack(inBlocks(bytes, 0), kFuzzNow);
-    const auto pieces = readTrack(inBlocks(bytes, 1U + data[0] + data[1] * 256U), kFuzzNow);
+    Places places;
+    Places samePlaces;
+    const auto whole = readTrack(inBlocks(bytes, 0), kFuzzNow, places);
+    const auto pieces =
+        readTrack(inBlocks(bytes, 1U + data[0] + data[1] * 256U), kFuzzNow, samePlaces);
     check(whole.has_value() == pieces.has_value(), "blocks do not decide whether a file is read");
     if (!whole) {
         check(!whole.error().empty(), "a refusal has a reason");
         return 0;
     }
     check(*whole == *pieces, "blocks do not change the records");
+    check(places == samePlaces, "blocks do not change the places");
     const auto sane = [](KSDateInterval span) {
         return span.start <= span.end && limits::isSane(span.start, kFuzzNow.now) &&
                limits::isSane(span.end, kFuzzNow.now);

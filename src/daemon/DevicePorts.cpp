@@ -63,6 +63,8 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     options.index = std::move(index);
     options.tracks = configuration.deviceData.tracks;
     options.photos = configuration.deviceData.photos;
+    options.places = configuration.deviceData.places;
+    options.gazetteer = configuration.deviceData.gazetteer;
     return options;
 }
 

@@ -47,6 +47,10 @@ inline constexpr std::size_t kMostZoneSpans = 10000;
 /// A track that spans more seconds than 31 days holds a wrong timestamp or is no workout.
 inline constexpr double kLongestWorkout = 31 * 86400.0;
 
+// Gazetteers.
+
+inline constexpr std::size_t kMostTowns = 1'000'000;
+
 // Photos.
 
 inline constexpr std::uint64_t kLargestPhoto = std::uint64_t{256} * 1024 * 1024;
