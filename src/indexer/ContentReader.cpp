@@ -31,12 +31,24 @@ std::expected<FileRecords, std::string> readTracks(int fd, FileKind kind,
     switch (kind) {
         case FileKind::track:
             return readTrackFile(fd, context, places);
-        default:
-            return FileRecords();
+        case FileKind::fit:
+            return readFitFile(fd, context, places);
+        case FileKind::ownTracks:
+            return readOwnTracksFile(fd, context, places);
+        case FileKind::locationHistory:
+            return readLocationHistoryFile(fd, context, places);
+        case FileKind::geoJson:
+            return readGeoJsonFile(fd, context, places);
+        case FileKind::unknown:
+        case FileKind::photo:
+            break;
     }
+    return FileRecords();
 }
 
-bool tellsOfPlaces(FileKind kind) { return kind == FileKind::track; }
+bool tellsOfPlaces(FileKind kind) {
+    return kind != FileKind::unknown && kind != FileKind::photo;
+}
 
 }  // namespace
 

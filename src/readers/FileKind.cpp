@@ -5,6 +5,8 @@
 #include <string_view>
 
 #include "readers/FileReaders.h"
+#include "readers/FitMessages.h"
+#include "readers/JsonStream.h"
 
 namespace keepsakes {
 
@@ -49,6 +51,83 @@ std::string_view rootName(std::string_view text) {
     return colon == std::string_view::npos ? name : name.substr(colon + 1);
 }
 
+/// Tells what a JSON document is by the names near its top, and by its GeoJSON type.
+class JsonHead final : public JsonHandler {
+  public:
+    void startObject() override { ++depth_; }
+    void endObject() override { --depth_; }
+    void startArray() override {
+        if (depth_ == 0) inArray_ = true;
+        ++depth_;
+    }
+    void endArray() override { --depth_; }
+
+    void key(std::string_view name) override {
+        key_ = name;
+        if (depth_ == 1) {
+            if (is(kHistoryRoots, name)) kind_ = FileKind::locationHistory;
+            hasLocations_ = hasLocations_ || name == "locations";
+        } else if (depth_ == 2 && inArray_ && is(kSegmentParts, name)) {
+            kind_ = FileKind::locationHistory;
+        } else if (hasLocations_ && is(kRecordParts, name)) {
+            kind_ = FileKind::locationHistory;
+        }
+    }
+
+    void scalar(const JsonScalar& value) override {
+        // Of a collection whose type stands behind its features, the first feature's type tells.
+        const bool tells = depth_ == 1 || (depth_ == 3 && kind_ == FileKind::unknown);
+        if (tells && key_ == "type" && value.text && is(kGeoJsonTypes, *value.text) &&
+            (depth_ == 1 || *value.text == "Feature")) {
+            kind_ = FileKind::geoJson;
+        }
+    }
+
+    FileKind kind() const { return kind_; }
+
+  private:
+    template <std::size_t size>
+    static bool is(const std::array<std::string_view, size>& names, std::string_view name) {
+        return std::ranges::find(names, name) != names.end();
+    }
+
+    static constexpr auto kHistoryRoots = std::to_array<std::string_view>(
+        {"timelineObjects", "semanticSegments", "rawSignals", "userLocationProfile"});
+    static constexpr auto kSegmentParts =
+        std::to_array<std::string_view>({"timelinePath", "timelineMemory", "visit", "activity"});
+    static constexpr auto kRecordParts =
+        std::to_array<std::string_view>({"latitudeE7", "longitudeE7", "timestampMs"});
+    // RFC 7946
+    static constexpr auto kGeoJsonTypes = std::to_array<std::string_view>(
+        {"FeatureCollection", "Feature", "Point", "MultiPoint", "LineString", "MultiLineString",
+         "Polygon", "MultiPolygon", "GeometryCollection"});
+
+    int depth_ = 0;
+    bool inArray_ = false;
+    bool hasLocations_ = false;
+    std::string key_;
+    FileKind kind_ = FileKind::unknown;
+};
+
+FileKind kindOfJson(std::string_view head) {
+    JsonHead json;
+    // Mostly an error, since the head ends anywhere; what came before it tells.
+    (void)readJson(head, json);
+    return json.kind();
+}
+
+/// "2015-08-24T05:55:07Z", a tabulator, a kind padded with blanks, a tabulator.
+bool isOwnTracksLine(std::string_view head) {
+    constexpr std::size_t kTimeLength = 20;
+    constexpr std::size_t kLongestKind = 64;
+    if (head.size() <= kTimeLength || head[kTimeLength] != '\t') return false;
+    const auto time = head.substr(0, kTimeLength);
+    if (time[10] != 'T' || time.back() != 'Z' || !parseISO8601(time)) return false;
+    const auto rest = head.substr(kTimeLength + 1, kLongestKind);
+    const auto kindEnd = rest.find_first_of("\t\r\n");
+    return kindEnd != std::string_view::npos && rest[kindEnd] == '\t';
+}
+
 }  // namespace
 
 FileKind kindOf(std::span<const std::byte> head) {
@@ -58,13 +137,17 @@ FileKind kindOf(std::span<const std::byte> head) {
     if (bytes.starts_with(kJpeg) || bytes.starts_with(kPng) || isHeif(bytes)) {
         return FileKind::photo;
     }
+    if (isFitHeader(bytes)) return FileKind::fit;
+    if (isOwnTracksLine(bytes)) return FileKind::ownTracks;
     // Names in UTF-16 are their ASCII letters with zero bytes between.
     if (bytes.starts_with("\xFF\xFE") || bytes.starts_with("\xFE\xFF") ||
         bytes.starts_with("<\0"sv) || bytes.starts_with("\0<"sv)) {
         std::erase(bytes, '\0');
     }
     const auto first = bytes.find_first_not_of(" \t\r\n\xEF\xBB\xBF\xFE\xFF");
-    if (first == std::string::npos || bytes[first] != '<') return FileKind::unknown;
+    if (first == std::string::npos) return FileKind::unknown;
+    if (bytes[first] == '{' || bytes[first] == '[') return kindOfJson(bytes);
+    if (bytes[first] != '<') return FileKind::unknown;
     const auto root = rootName(bytes);
     return root == "gpx" || root == "TrainingCenterDatabase" ? FileKind::track : FileKind::unknown;
 }

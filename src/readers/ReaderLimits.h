@@ -27,12 +27,13 @@ inline constexpr bool isOffset(int seconds) {
     return seconds >= kLowestOffset && seconds <= kHighestOffset;
 }
 
-// XML.
+// XML and JSON.
 
 /// Bytes per read.
 inline constexpr std::size_t kBlockSize = std::size_t{64} * 1024;
-/// A single tag, comment or the like may be so long. The parser looks at an unfinished one again
-/// with each block, so that a longer one would cost its length squared.
+/// A single tag, comment or the like may be so long. The XML parser looks at an unfinished one
+/// again with each block, so that a longer one would cost its length squared. The JSON parser holds
+/// the text back to the last string or number.
 inline constexpr std::size_t kLongestToken = std::size_t{1024} * 1024;
 /// Elements within elements.
 inline constexpr std::size_t kDeepestElement = 64;
@@ -50,6 +51,15 @@ inline constexpr double kLongestWorkout = 31 * 86400.0;
 // Gazetteers.
 
 inline constexpr std::size_t kMostTowns = 1'000'000;
+
+// Location histories.
+
+/// Points of a path whose times stand apart from them, and which wait for those.
+inline constexpr std::size_t kMostPathPoints = 500000;
+/// A stay of more seconds than a year holds a wrong timestamp.
+inline constexpr double kLongestStay = 366 * 86400.0;
+/// Bytes of a line of a recording.
+inline constexpr std::size_t kLongestLine = std::size_t{64} * 1024;
 
 // Photos.
 

@@ -1,0 +1,16 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <expected>
+#include <string>
+
+#include "readers/FileReaders.h"
+#include "readers/XmlStream.h"
+
+namespace keepsakes {
+
+/// `readFitFile` for bytes from anywhere.
+std::expected<FileRecords, std::string> readFit(const ReadBlock& read, const ReaderContext& context,
+                                                LocationSink& places);
+
+}  // namespace keepsakes

@@ -1,0 +1,212 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "readers/GeoJsonReader.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <array>
+#include <cstdint>
+#include <limits>
+#include <optional>
+#include <utility>
+#include <vector>
+
+#include "readers/JsonStream.h"
+#include "readers/Position.h"
+#include "readers/ReaderLimits.h"
+#include "readers/StatedPlaces.h"
+
+namespace keepsakes {
+
+namespace {
+
+enum class Place : std::uint8_t {
+    document,  ///< The top object, which may be a feature or a geometry itself.
+    ignored,
+    feature,
+    geometry,
+    geometryType,
+    coordinates,
+    properties,
+    coordinateProperties,
+    time,
+    times,
+    accuracy,
+    name,
+    use,
+    location,
+};
+
+// RFC 7946 fixes the members of features and geometries. Properties are free; these are the names
+// that recording apps and map sites use.
+constexpr auto kSteps = std::to_array<JsonStep<Place>>({
+    {Place::document, "features", Place::feature},
+    {Place::document, "geometry", Place::geometry},
+    {Place::document, "properties", Place::properties},
+    {Place::document, "type", Place::geometryType},
+    {Place::document, "coordinates", Place::coordinates},
+    {Place::feature, "geometry", Place::geometry},
+    {Place::feature, "properties", Place::properties},
+    {Place::geometry, "type", Place::geometryType},
+    {Place::geometry, "coordinates", Place::coordinates},
+    {Place::properties, "time", Place::time},
+    {Place::properties, "timestamp", Place::time},
+    {Place::properties, "tst", Place::time},
+    {Place::properties, "coordTimes", Place::times},
+    {Place::properties, "times", Place::times},
+    {Place::properties, "coordinateProperties", Place::coordinateProperties},
+    {Place::coordinateProperties, "times", Place::times},
+    {Place::properties, "accuracy", Place::accuracy},
+    {Place::properties, "horizontal_accuracy", Place::accuracy},
+    {Place::properties, "name", Place::name},
+    {Place::properties, "Name", Place::name},
+    {Place::properties, "title", Place::name},
+    {Place::properties, "Title", Place::name},
+    {Place::properties, "use", Place::use},
+    {Place::properties, "location", Place::location},
+    {Place::location, "name", Place::name},
+});
+
+struct Feature {
+    bool isPoint = false;
+    bool isLine = false;
+    std::vector<std::optional<GeoPoint>> positions;
+    std::vector<std::optional<KSDate>> times;
+    std::optional<KSDate> time;
+    bool hasTime = false;
+    float accuracyMeters = std::numeric_limits<float>::quiet_NaN();
+    std::string name;
+    std::string use;
+};
+
+class GeoJson final : public JsonPlaces<Place> {
+  public:
+    GeoJson(const ReaderContext& context, LocationSink& places)
+        : times_(context.now), places_(places) {}
+
+    std::expected<FileRecords, std::string> finish() {
+        if (tooLong_) {
+            return std::unexpected(
+                fmt::format("a line of more than {} points", limits::kMostPathPoints));
+        }
+        if (auto complaint = times_.complaint()) return std::unexpected(std::move(*complaint));
+        return FileRecords{};
+    }
+
+  protected:
+    Place placeOf(Place parent, std::string_view name) const override {
+        return stepFrom<Place>(parent, name, kSteps);
+    }
+
+    void enter(Place place) override {
+        if (place == Place::feature || place == Place::document) feature_ = {};
+    }
+
+    void leave(Place place) override {
+        if (place == Place::feature || place == Place::document) tell();
+        if (place == Place::feature) feature_ = {};
+    }
+
+    void enterArray(Place place) override {
+        if (place == Place::coordinates) position_.clear();
+    }
+
+    /// The innermost arrays are the positions, at any depth.
+    void leaveArray(Place place) override {
+        if (place != Place::coordinates || position_.empty()) return;
+        if (hasRoom(feature_.positions)) {
+            feature_.positions.push_back(
+                position_.size() < 2 ? std::nullopt : geoPoint(position_[1], position_[0]));
+        }
+        position_.clear();
+    }
+
+    void take(Place place, const JsonScalar& value) override {
+        switch (place) {
+            case Place::geometryType:
+                feature_.isPoint = value.text == "Point";
+                feature_.isLine = value.text == "LineString" || value.text == "MultiLineString" ||
+                                  value.text == "MultiPoint";
+                break;
+            case Place::coordinates:
+                // Longitude, latitude, and an altitude that is not needed.
+                if (position_.size() < 2) position_.push_back(value.number);
+                break;
+            case Place::time:
+                feature_.hasTime = true;
+                feature_.time = timeAt(value);
+                break;
+            case Place::times:
+                if (hasRoom(feature_.times)) feature_.times.push_back(timeAt(value));
+                break;
+            case Place::accuracy:
+                feature_.accuracyMeters = accuracyOf(value);
+                break;
+            case Place::name:
+                if (feature_.name.empty()) feature_.name = nameOf(value);
+                break;
+            case Place::use:
+                feature_.use = nameOf(value);
+                break;
+            default:
+                break;
+        }
+    }
+
+  private:
+    std::optional<KSDate> timeAt(const JsonScalar& value) {
+        const auto time = times_.take(timeOf(value));
+        return time ? std::optional(time->date) : std::nullopt;
+    }
+
+    bool hasRoom(const auto& list) {
+        tooLong_ = tooLong_ || list.size() == limits::kMostPathPoints;
+        return !tooLong_;
+    }
+
+    void tell() {
+        const auto& positions = feature_.positions;
+        if (feature_.isPoint && positions.size() == 1 && positions[0]) {
+            tellPoint(*positions[0]);
+        } else if (feature_.isLine && feature_.times.size() == positions.size()) {
+            for (std::size_t i = 0; i < positions.size(); ++i) {
+                if (!positions[i] || !feature_.times[i]) continue;
+                places_.point({*feature_.times[i], *positions[i], feature_.accuracyMeters});
+            }
+        }
+    }
+
+    void tellPoint(const GeoPoint& position) {
+        if (feature_.time) {
+            places_.point({*feature_.time, position, feature_.accuracyMeters});
+        } else if (!feature_.hasTime && !feature_.name.empty()) {
+            const auto stated = useOfLabel(feature_.use);
+            places_.place({.position = position,
+                           .name = feature_.name,
+                           .use = stated == PlaceUse::unknown ? useOfName(feature_.name) : stated});
+        }
+    }
+
+    TimeTally times_;
+    LocationSink& places_;
+    Feature feature_;
+    std::vector<std::optional<double>> position_;  // longitude, latitude
+    bool tooLong_ = false;
+};
+
+}  // namespace
+
+std::expected<FileRecords, std::string> readGeoJson(const ReadBlock& read,
+                                                    const ReaderContext& context,
+                                                    LocationSink& places) {
+    GeoJson geoJson(context, places);
+    if (auto done = readJson(read, geoJson); !done) return std::unexpected(std::move(done.error()));
+    return geoJson.finish();
+}
+
+std::expected<FileRecords, std::string> readGeoJsonFile(int fd, const ReaderContext& context,
+                                                        LocationSink& places) {
+    return readGeoJson(readDescriptor(fd), context, places);
+}
+
+}  // namespace keepsakes
