@@ -4,12 +4,14 @@
 #include <utility>
 
 #include "sources/KSPhotoManager.h"
+#include "sources/KSRoutineServiceManager.h"
 #include "sources/KSVitalsManager.h"
 
 namespace keepsakes {
 
 EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
+      routineServiceManager_(universe.service<KSRoutineServiceManager>("RoutineServiceManager")),
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")) {
     if (vitalsManager_) {
         steps_.push_back({"resultWorkoutsSuccess",
@@ -17,6 +19,13 @@ EventSources::EventSources(const ServiceLookup& universe)
                               source->fetchAndSaveWorkoutsBetweenStartDate(start, end,
                                                                            std::move(done));
                           }});
+    }
+    if (routineServiceManager_) {
+        steps_.push_back(
+            {"resultVisitsSuccess",
+             [source = routineServiceManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveVisitsBetweenStartDate(start, end, std::move(done));
+             }});
     }
     if (photoManager_) {
         steps_.push_back(
@@ -30,6 +39,12 @@ EventSources::EventSources(const ServiceLookup& universe)
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
                                                      ResultHandler handler) const {
     switch (group.front()->category()) {
+        case KSEventCategory::visit:
+            if (routineServiceManager_) {
+                routineServiceManager_->removeVisitsDeletedAtSource(group, std::move(handler));
+                return;
+            }
+            break;
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->removePhotoEventsDeletedAtSource(group, std::move(handler));
@@ -45,6 +60,12 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
 void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
                                                   EventsHandler handler) const {
     switch (group.front()->category()) {
+        case KSEventCategory::visit:
+            if (routineServiceManager_) {
+                routineServiceManager_->rehydrateVisits(group, std::move(handler));
+                return;
+            }
+            break;
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->rehydratePhotoKeepsakes(group, std::move(handler));

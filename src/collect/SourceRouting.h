@@ -13,6 +13,7 @@
 namespace keepsakes {
 
 class KSPhotoManager;
+class KSRoutineServiceManager;
 class KSVitalsManager;
 
 /// One source's part of a collection.
@@ -41,6 +42,7 @@ class EventSources {
 
   private:
     std::shared_ptr<KSVitalsManager> vitalsManager_;
+    std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
     std::shared_ptr<KSPhotoManager> photoManager_;
     std::vector<CollectionStep> steps_;
 };

@@ -9,6 +9,7 @@
 #include "daemon/MemoryRelease.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
+#include "devicedata/IndexedRoutineService.h"
 #include "linux/AnalyticsLog.h"
 #include "linux/IndexerProcess.h"
 #include "linux/PropertyListDefaults.h"
@@ -79,6 +80,7 @@ struct DevicePorts::Adapters {
           analytics(folders.analyticsFile(), *clock),
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
+          routine(folders.cache / kIndexFile, *clock),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           memory(*clock) {}
 
@@ -90,6 +92,7 @@ struct DevicePorts::Adapters {
     AnalyticsLog analytics;
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
+    IndexedRoutineService routine;
     IndexerProcess deviceData;
     MemoryRelease memory;
 };
@@ -104,6 +107,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
     services_.analytics = &adapters_->analytics;
     services_.healthStore = &adapters_->health;
     services_.photoAnalysis = &adapters_->photos;
+    services_.routineService = &adapters_->routine;
     services_.deviceData = &adapters_->deviceData;
     services_.problems = &adapters_->problems;
     services_.requestEnded = [adapters = adapters_.get()] { adapters->memory.soon(); };

@@ -46,9 +46,7 @@ std::expected<FileRecords, std::string> readTracks(int fd, FileKind kind,
     return FileRecords();
 }
 
-bool tellsOfPlaces(FileKind kind) {
-    return kind != FileKind::unknown && kind != FileKind::photo;
-}
+bool tellsOfPlaces(FileKind kind) { return kind != FileKind::unknown && kind != FileKind::photo; }
 
 }  // namespace
 

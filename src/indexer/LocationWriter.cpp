@@ -5,8 +5,8 @@
 #include <cmath>
 #include <cstdlib>
 
-#include "readers/PlaceWords.h"
 #include "readers/ReaderLimits.h"
+#include "readers/StatedPlaces.h"
 
 namespace keepsakes {
 
@@ -93,7 +93,7 @@ void LocationWriter::place(NamedPlace place) {
         return;
     }
     if (place.use == PlaceUse::unknown && place.origin == NamedPlace::Origin::owner) {
-        place.use = useOfPlaceName(place.name);
+        place.use = useOfName(place.name);
     }
     guarded([this, &place] { index_.putNamedPlace(file_, place); });
 }

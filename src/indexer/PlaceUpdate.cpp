@@ -96,6 +96,7 @@ class Update {
     explicit Update(SQLite::Database& database) : database_(database), names_(database) {}
 
     void run() {
+        forgetDoubtfulVisits();
         loadVisits();
         loadPlaces();
         const auto places = formPlaces(visits_);
@@ -107,6 +108,12 @@ class Update {
     }
 
   private:
+    void forgetDoubtfulVisits() {
+        SQLite::Statement forget(database_, "UPDATE visits SET place = NULL WHERE confidence < ?");
+        forget.bind(1, kHighConfidence);
+        forget.exec();
+    }
+
     void loadVisits() {
         SQLite::Statement query(database_,
                                 "SELECT id, start, end, latitude, longitude, place, name, use"

@@ -15,6 +15,7 @@ class HealthStore;
 class LockState;
 class PhotoAnalysis;
 class Problems;
+class RoutineService;
 class UserDefaults;
 
 /// What the daemon may do by itself; fixed at start by the owner's diagnostics policy.
@@ -36,6 +37,7 @@ struct PlatformServices {
     AnalyticsService* analytics = nullptr;
     HealthStore* healthStore = nullptr;
     PhotoAnalysis* photoAnalysis = nullptr;
+    RoutineService* routineService = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BusListener* listener = nullptr;
     Problems* problems = nullptr;

@@ -12,9 +12,9 @@
 #include <utility>
 #include <vector>
 
-#include "readers/PlaceWords.h"
 #include "readers/Position.h"
 #include "readers/ReaderLimits.h"
+#include "readers/StatedPlaces.h"
 #include "readers/TextFolding.h"
 #include "readers/TrackSummary.h"
 
@@ -251,8 +251,10 @@ class TrackFile final : public XmlHandler {
                 waypoint_.name = cleanText(value().value_or(""));
                 break;
             case Place::waypointWord:
+                // How receivers call the symbol of a house.
+                if (value() == "Residence") waypoint_.use = PlaceUse::home;
                 if (waypoint_.use == PlaceUse::unknown) {
-                    waypoint_.use = useOfPlaceName(value().value_or(""));
+                    waypoint_.use = useOfName(value().value_or(""));
                 }
                 break;
             case Place::waypoint:

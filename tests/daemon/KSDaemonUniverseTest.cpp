@@ -20,8 +20,8 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
     EXPECT_THAT(
         universe.serviceNames(),
         ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
-                    "PhotoManager", "VitalsManager", "DefaultsManager", "EventManager",
-                    "EventBundleManager", "Server", "DaemonClientNotifier"));
+                    "PhotoManager", "RoutineServiceManager", "VitalsManager", "DefaultsManager",
+                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;
         EXPECT_EQ(universe.getService(name), universe.getService(name));
