@@ -20,6 +20,9 @@ namespace {
 /// the neighbours by which jumps are told.
 constexpr double kSafetyMargin = 3600;
 
+/// How long before a visit one may have begun that it is compared with, in seconds.
+constexpr double kLookBack = 7 * kSecondsPerDay;
+
 struct VisitRow {
     KSDateInterval stay;
     GeoPoint position;
@@ -225,8 +228,18 @@ class Update {
             if (same != last) {
                 former.erase(same);
             } else {
-                // What began at the same moment is at the same place, though it ends otherwise.
-                fresh.emplace_back(&visit, first == last ? std::nullopt : first->second.place);
+                fresh.emplace_back(&visit, std::nullopt);
+            }
+        }
+        for (auto& [visit, place] : fresh) {
+            // What shares time and place with a former visit is that one, longer or shorter.
+            const auto end = former.upper_bound(visit->stay.end.seconds);
+            auto row = former.lower_bound(visit->stay.start.seconds - kLookBack);
+            for (; row != end && !place; ++row) {
+                const auto& [known, knownPlace] = std::tie(row->second.row, row->second.place);
+                const bool isSame = visit->stay.start <= known.stay.end &&
+                                    distanceBetween(known.position, visit->position) <= kStayRadius;
+                if (isSame) place = knownPlace;
             }
         }
         for (const auto& [start, row] : former) remove(row.id);
