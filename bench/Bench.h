@@ -2,6 +2,7 @@
 #pragma once
 
 #include <fmt/format.h>
+#include <sys/resource.h>
 
 #include <algorithm>
 #include <chrono>
@@ -21,6 +22,13 @@ double bestMilliseconds(int runs, const Work& work) {
         best = std::min(best, took.count());
     }
     return best;
+}
+
+/// The most memory that was resident so far.
+inline long peakKiB() {
+    rusage usage{};
+    ::getrusage(RUSAGE_SELF, &usage);
+    return usage.ru_maxrss;
 }
 
 /// The one line of a benchmark, as scripts/bench.sh reads it.

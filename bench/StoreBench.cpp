@@ -38,7 +38,7 @@ struct Store {
     Store() {
         setLogLevel(LogLevel::off);
         universe.add("TocsinNotifier",
-                     std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock));
+                     std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.services));
         universe.add("PersistenceManager", KSPersistenceManager::initWithUniverse(universe));
         store = KSEventStore::initWithUniverse(universe);
         WorkerThreads::shared().settle();

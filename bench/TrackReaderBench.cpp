@@ -3,7 +3,6 @@
 // peak of resident memory. The file is made in the folder for temporary files and removed.
 #include <fcntl.h>
 #include <fmt/core.h>
-#include <sys/resource.h>
 #include <unistd.h>
 
 #include <chrono>
@@ -14,6 +13,7 @@
 #include <string>
 #include <vector>
 
+#include "Bench.h"
 #include "readers/FileReaders.h"
 #include "readers/ReaderLimits.h"
 #include "readers/XmlStream.h"
@@ -66,12 +66,6 @@ double seconds(const auto& work) {
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
 }
 
-long peakKiB() {
-    rusage usage{};
-    ::getrusage(RUSAGE_SELF, &usage);
-    return usage.ru_maxrss;
-}
-
 }  // namespace
 
 int main() {
@@ -90,7 +84,7 @@ int main() {
     };
     readBytes();  // The file is then cached for both.
     const double bytesOnly = seconds(readBytes);
-    const long before = peakKiB();
+    const long before = bench::peakKiB();
     std::size_t workouts = 0;
     std::string error;
     NoPlaces places;
@@ -110,7 +104,7 @@ int main() {
     fmt::print("read {:.0f} MB of GPX / reading only its bytes|{:.2f} s|{:.3f} s|{:.1f}|-\n",
                megabytes, parsed, bytesOnly, parsed / bytesOnly);
     constexpr long kMostGrowthKiB = 16 * 1024;
-    const long growth = peakKiB() - before;
+    const long growth = bench::peakKiB() - before;
     fmt::print("memory of reading it|{} KiB|{} KiB|{:.2f}|1\n", growth, kMostGrowthKiB,
                static_cast<double>(growth) / kMostGrowthKiB);
     return error.empty() && workouts > 0 ? 0 : 1;

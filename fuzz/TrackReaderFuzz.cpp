@@ -1,11 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // Property: the records do not depend on how the bytes come in, and every workout is a span of
 // believable times. The first two bytes choose the sizes of the blocks.
-#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
-#include <random>
 #include <string>
 #include <utility>
 #include <vector>
@@ -17,17 +15,6 @@
 namespace {
 
 using namespace keepsakes;
-
-ReadBlock inBlocks(std::string_view bytes, std::size_t seed) {
-    return [bytes, random = std::minstd_rand(static_cast<unsigned>(seed)),
-            seed](std::span<char> into) mutable -> std::expected<std::size_t, std::string> {
-        const auto most = seed == 0 ? into.size() : 1 + random() % 64;
-        const auto count = std::min({most, bytes.size(), into.size()});
-        std::memcpy(into.data(), bytes.data(), count);
-        bytes.remove_prefix(count);
-        return count;
-    };
-}
 
 /// What the sink gets, and that it is on earth.
 struct Places final : LocationSink {

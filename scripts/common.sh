@@ -12,15 +12,17 @@ parallel_jobs() {
     echo $((memory < processors ? memory : processors))
 }
 
-# build PRESET: configures and builds, showing how far it is; what the tools say only on failure.
+# build PRESET [CMAKE BUILD ARGUMENT...]: configures and builds, showing how far it is; what the tools
+# say only on failure.
 build() {
     local preset=$1 log=build/$1/build.log
+    shift
     mkdir -p "build/$preset"
     if ! cmake --preset "$preset" >"$log" 2>&1 </dev/null; then
         cat "$log" >&2
         return 1
     fi
-    if ! cmake --build --preset "$preset" -j "$(parallel_jobs)" 2>&1 </dev/null | tee "$log" |
+    if ! cmake --build --preset "$preset" -j "$(parallel_jobs)" "$@" 2>&1 </dev/null | tee "$log" |
         show_steps "built $preset" '^\[[0-9]+\/[0-9]+\]'; then
         grep -vE '^\[[0-9]+/[0-9]+\] (Building|Linking)' "$log" >&2
         return 1

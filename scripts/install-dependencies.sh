@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
 # Installs from Debian 12 what the project needs and this machine does not have yet.
-#   scripts/install-dependencies.sh [build] [test] [lint]     (all three when none is named)
+#   scripts/install-dependencies.sh [build] [test] [lint] [package]   (all when none is named)
 # Says nothing when nothing is missing. Needs root, or sudo.
 set -euo pipefail
 
@@ -9,15 +9,17 @@ declare -A packages=(
     [build]="ccache cmake g++ git libcli11-dev libexiv2-dev libexpat1-dev libfmt-dev libicu-dev libpugixml-dev
              libseccomp-dev libspdlog-dev libsqlite3-dev libsqlitecpp-dev libsystemd-dev
              libtomlplusplus-dev nettle-dev ninja-build nlohmann-json3-dev pkg-config tzdata"
-    [test]="dbus dbus-daemon libglib2.0-bin libgmock-dev libgtest-dev python3 python3-dbus sqlite3"
+    [test]="bash-completion binutils dbus dbus-daemon libglib2.0-bin libgmock-dev libgtest-dev python3
+            python3-dbus python3-dbusmock python3-gi python3-seccomp sqlite3 systemd"
     [lint]="clang-19 clang-format-14 clang-tidy-19 libclang-rt-19-dev"
+    [package]="build-essential debhelper dpkg-dev lintian"
 )
 
 groups=("$@")
-[ ${#groups[@]} -gt 0 ] || groups=(build test lint)
+[ ${#groups[@]} -gt 0 ] || groups=(build test lint package)
 wanted=()
 for group in "${groups[@]}"; do
-    [ -n "${packages[$group]:-}" ] || { echo "unknown group: $group (build, test, lint)" >&2; exit 2; }
+    [ -n "${packages[$group]:-}" ] || { echo "unknown group: $group (build, test, lint, package)" >&2; exit 2; }
     read -r -d '' -a more <<<"${packages[$group]}" || true
     wanted+=("${more[@]}")
 done

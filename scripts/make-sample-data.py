@@ -14,9 +14,11 @@ The owner lives in Graz (Europe/Vienna, UTC+2 that week):
              and in an inn on Saturday, in a concert hall on Saturday night, at a lake on Sunday;
              home, work, the inn and the hall are waypoints of the owner's
   Saturday   a hike (GPX), with photos
+and what she listened to that week, as records of the now-playing stream (CSV);
 and two files that cannot be read: a GPX file cut in the middle, a photo without a date.
 """
 
+import csv
 import math
 import struct
 import subprocess
@@ -332,12 +334,47 @@ def make_places(folder):
     (folder / "places.gpx").write_text(waypoints(PLACES))
 
 
+# What was played
+
+
+SONG = ("Morgenlauf", "Die Beispiele", "Im Takt", "Pop", "org.example.Music", 214)
+OTHER = ("Nur einmal", "Die Beispiele", "Im Takt", "Pop", "org.example.Music", 187)
+EPISODE = ("Wege am Grat", "Berggespräche", "", "Podcast", "org.gnome.Podcasts", 2710)
+
+PLAYS = [
+    # item, local start, seconds played, how it ended (2 paused, 3 stopped, 4 gave way)
+    (SONG, "2024-06-12 18:31:00", 214, 4),
+    (OTHER, "2024-06-12 18:34:34", 187, 4),
+    (SONG, "2024-06-12 18:40:00", 214, 4),
+    (SONG, "2024-06-12 18:43:34", 214, 4),
+    (SONG, "2024-06-12 18:47:08", 120, 2),
+    (EPISODE, "2024-06-13 21:05:00", 1500, 2),
+    (EPISODE, "2024-06-13 21:40:00", 1210, 3),
+]
+
+
+def make_plays(folder):
+    """A row for the start and one for the end of each play; columns as in the stream's file."""
+    folder.mkdir(parents=True, exist_ok=True)
+    reference = datetime(2001, 1, 1)
+    with open(folder / "plays.csv", "w", newline="", encoding="utf-8") as file:
+        writer = csv.writer(file, lineterminator="\n")
+        writer.writerow(["timestamp", "state", "duration", "title", "album", "artist", "genre",
+                         "bundleID"])
+        for (title, artist, album, genre, player, length), start, seconds, end in PLAYS:
+            begin = (utc(start) - LOCAL_OFFSET - reference).total_seconds()
+            for timestamp, state in ((begin, 1), (begin + seconds, end)):
+                writer.writerow([f"{timestamp:.0f}", state, length, title, album, artist, genre,
+                                 player])
+
+
 def main():
     beside = Path(__file__).resolve().parent.parent / "data" / "sample"
     folder = Path(sys.argv[1]) if len(sys.argv) > 1 else beside
     make_tracks(folder / "tracks")
     make_places(folder / "places")
     make_photos(folder / "photos")
+    make_plays(folder / "media")
 
 
 if __name__ == "__main__":

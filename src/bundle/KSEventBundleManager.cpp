@@ -137,7 +137,7 @@ void KSEventBundleManager::_bundleEventsWithStartDate(KSDate start, KSDate end, 
         std::ranges::move(valuesOf(clusterBundles), std::back_inserter(bundles));
         saveEventBundles(bundles, start, end, handler);
     }
-    if (submits) metrics_.submitMetricForEventBundle(events, clusters, ruleBundles);
+    if (submits) metrics_.submitMetricForEventBundle(end - start, events, clusters, ruleBundles);
 }
 
 KSEventBundler::Bundles KSEventBundleManager::getUnfilteredEventBundleFrom(

@@ -29,8 +29,8 @@ class KSEventBundleManager final : public KSService {
 
     /// Takes what a pass computed, for usage metrics; called on the manager's queue.
     struct MetricsObserver {
-        std::function<void(const KSEventArray& events, const KSEventBundler::Clusters&,
-                           const KSEventBundler::Bundles&)>
+        std::function<void(double windowSeconds, const KSEventArray& events,
+                           const KSEventBundler::Clusters&, const KSEventBundler::Bundles&)>
             submitMetricForEventBundle;
         std::function<void(const KSEventArray& events, KSDate start, KSDate end, KSDate subDate)>
             submitKSEventData;

@@ -106,6 +106,9 @@ constexpr auto kRuleSubjects = std::to_array<Phrase>({
     {"HikingPlusPhotos", "mountain"},
 });
 
+/// What a cluster of nothing else but media is called.
+constexpr std::string_view kMediaSentence = "Watched or listened to";
+
 constexpr std::string_view kDay = "EEEE";
 constexpr std::string_view kTime = "HH:mm";
 
@@ -122,6 +125,12 @@ std::string timeText(KSDateInterval span) {
 std::string photosText(std::int64_t count, std::string_view subject) {
     auto text = count == 1 ? "1 photo" : count > 1 ? fmt::format("{} photos", count) : "photos";
     if (!subject.empty()) text += fmt::format(" of {}", subject);
+    return text;
+}
+
+std::string mediaText(const std::string& title, const std::string& artist, double repetitions) {
+    auto text = artist.empty() ? title : fmt::format("{} by {}", title, artist);
+    if (repetitions > 1) text += fmt::format(" ({:.0f} times)", repetitions);
     return text;
 }
 
@@ -168,10 +177,16 @@ std::string_view visitHeadline(const KSEventBundle& bundle) {
     return {};
 }
 
+bool isMedia(const KSEventPointer& event) {
+    return event->category() == KSEventCategory::mediaOnRepeat ||
+           event->category() == KSEventCategory::leisureMedia;
+}
+
 std::string_view headline(const KSEventBundle& bundle) {
     if (const auto sentence = phraseOf(kRuleSentences, bundle.bundleType); !sentence.empty()) {
         return sentence;
     }
+    if (std::ranges::all_of(bundle.events, isMedia)) return kMediaSentence;
     const bool workout = holds(bundle, KSEventCategory::workout);
     const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
     const bool visit = holds(bundle, KSEventCategory::visit);
@@ -197,7 +212,10 @@ std::vector<std::string> titles(const KSEventBundle& bundle) {
         addDistinct(texts, event->placeName);
         addDistinct(texts, event->tripTitle);
         addDistinct(texts, event->suggestedEventTitle);
-        addDistinct(texts, event->mediaTitle);
+        if (event->mediaTitle && !event->mediaTitle->empty()) {
+            addDistinct(texts, mediaText(*event->mediaTitle, event->mediaArtist.value_or(""),
+                                         event->mediaRepetitions.value_or(0)));
+        }
         addDistinct(texts, event->itemLinkTitle ? event->itemLinkTitle : event->itemDisplayName);
     }
     return texts;

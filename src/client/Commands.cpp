@@ -4,6 +4,8 @@
 #include <fmt/format.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cmath>
 #include <cstdio>
 #include <iostream>
 
@@ -54,6 +56,18 @@ std::string visitDetails(const KSEvent& event) {
     return details;
 }
 
+/// How often and for how long media were played: "3 times, 1 h 30 min".
+std::string playedText(double repetitions, double seconds) {
+    std::string text;
+    if (repetitions > 0) {
+        text = repetitions == 1 ? "once, " : fmt::format("{:.0f} times, ", repetitions);
+    }
+    const auto minutes = std::llround(std::clamp(seconds / 60, 0.0, 1e9));
+    if (seconds < 60) return text + fmt::format("{:.0f} s", std::max(seconds, 0.0));
+    if (minutes < 60) return text + fmt::format("{} min", minutes);
+    return text + fmt::format("{} h {} min", minutes / 60, minutes % 60);
+}
+
 /// What tells one event from another of its kind.
 std::string detailsOf(const KSEvent& event) {
     if (event.category() == KSEventCategory::visit) return visitDetails(event);
@@ -69,6 +83,9 @@ std::string detailsOf(const KSEvent& event) {
     add(event.tripTitle);
     add(event.mediaTitle);
     add(event.mediaArtist);
+    if (event.mediaSumTimePlayed) {
+        add(playedText(event.mediaRepetitions.value_or(0), *event.mediaSumTimePlayed));
+    }
     add(event.itemDisplayName ? event.itemDisplayName : event.itemLinkTitle);
     if (const auto& photos = event.extendedAttributes) {
         for (const auto& word :
@@ -213,38 +230,6 @@ int showBundles(const Console& console, const FetchWords& words) {
     std::string text;
     for (const auto& bundle : *bundles) text += bundleText(*bundle, console.screen()) + "\n";
     return console.print(text + counted(bundles->size(), "bundle") + "\n");
-}
-
-int showTrends(const Console& console, const std::string& file) {
-    KSEventArray events;
-    if (!file.empty()) {
-        const auto text = readInput(file);
-        if (!text) return console.fail(text.error());
-        auto given = eventsFromJson(*text);
-        if (!given) return console.fail(given.error());
-        events = std::move(*given);
-    }
-    const auto client = console.connect();
-    if (!client) return console.fail(client.error());
-    if (file.empty()) {
-        KSEventFetchOptions options;
-        options.ascending = true;
-        auto stored = (*client)->fetchEventsWithOptions(options);
-        if (!stored) return console.fail(stored.error());
-        events = std::move(*stored);
-    }
-    const auto trends = (*client)->analyzeTrendsInEvents(events);
-    console.endProgress();
-    if (!trends) return console.fail(trends.error());
-    if (console.json()) return console.print(jsonRecords(*trends));
-    Table table({"Start", "Category", "Details", "Trends"});
-    for (const auto& event : *trends) {
-        const auto found = jsonText(jsonForm(KSValue(event->trends.value_or(KSDictionary()))));
-        table.add({shown(event->startDate()), event->describeCategory(), detailsOf(*event),
-                   found.value_or("")});
-    }
-    return console.print((trends->empty() ? "" : table.text(console.screen())) +
-                         counted(trends->size(), "event") + "\n");
 }
 
 int doWork(const Console& console, Work work) {

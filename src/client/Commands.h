@@ -24,8 +24,9 @@ struct FetchWords {
 };
 int showEvents(const Console& console, const FetchWords& words);
 int showBundles(const Console& console, const FetchWords& words);
-/// In the stored events, or in a file's when one is given.
-int showTrends(const Console& console, const std::string& file);
+/// In the stored events, or in a file's when one is given. `now` is for a daemon whose clock was
+/// set; empty for this computer's.
+int showTrends(const Console& console, const std::string& file, const std::string& now);
 
 /// One of the operations that take nothing and answer nothing.
 using Work = OptionalError (ConduitClient::*)();

@@ -56,12 +56,16 @@ std::string_view nameOf(const KSError& error) {
 }  // namespace
 
 bool meansNoDaemon(const KSError& error) {
-    constexpr std::array<std::string_view, 5> kNames{
-        SD_BUS_ERROR_SERVICE_UNKNOWN, SD_BUS_ERROR_NAME_HAS_NO_OWNER, SD_BUS_ERROR_DISCONNECTED,
-        SD_BUS_ERROR_NO_SERVER, SD_BUS_ERROR_NO_REPLY};
+    // The last one: the daemon was started and does not come up.
+    constexpr std::array<std::string_view, 6> kNames{
+        SD_BUS_ERROR_SERVICE_UNKNOWN, SD_BUS_ERROR_NAME_HAS_NO_OWNER,
+        SD_BUS_ERROR_DISCONNECTED,    SD_BUS_ERROR_NO_SERVER,
+        SD_BUS_ERROR_NO_REPLY,        "org.freedesktop.DBus.Error.TimedOut"};
     const auto name = nameOf(error);
+    // What starts the daemon, the bus itself or systemd, says why it does not.
     return std::ranges::find(kNames, name) != kNames.end() ||
-           name.starts_with("org.freedesktop.DBus.Error.Spawn.");
+           name.starts_with("org.freedesktop.DBus.Error.Spawn.") ||
+           name.starts_with("org.freedesktop.systemd1.");
 }
 
 bool meansTooLarge(const KSError& error) { return nameOf(error) == bus::kLimitsExceeded; }

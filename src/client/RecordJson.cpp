@@ -23,12 +23,18 @@ KSDictionary archived(const Record& record) {
     return *jsonForm(KSValue(encoder.take())).asDictionary();
 }
 
+const KSDictionary& formOf(const KSDictionary& record) { return record; }
+template <class Record>
+KSDictionary formOf(const std::shared_ptr<const Record>& record) {
+    return jsonForm(*record);
+}
+
 template <class Array>
 std::string recordLines(const Array& records) {
     std::string text = "[";
     for (const auto& record : records) {
         text += text.size() > 1 ? ",\n" : "\n";
-        text += jsonText(jsonForm(*record)).value_or("null");
+        text += jsonText(formOf(record)).value_or("null");
     }
     return text + (records.empty() ? "]\n" : "\n]\n");
 }
@@ -68,6 +74,7 @@ KSDictionary jsonForm(const KSEvent& event) { return archived(event); }
 KSDictionary jsonForm(const KSEventBundle& bundle) { return archived(bundle); }
 std::string jsonRecords(const KSEventArray& events) { return recordLines(events); }
 std::string jsonRecords(const KSEventBundleArray& bundles) { return recordLines(bundles); }
+std::string jsonRecords(const std::vector<KSDictionary>& records) { return recordLines(records); }
 
 std::expected<KSEventPointer, KSError> eventFromJson(const KSValue& record) {
     return recordFrom<KSEvent>(record);

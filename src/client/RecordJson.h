@@ -23,6 +23,7 @@ KSDictionary jsonForm(const KSEventBundle& bundle);
 /// One record a line between brackets; valid JSON as a whole.
 std::string jsonRecords(const KSEventArray& events);
 std::string jsonRecords(const KSEventBundleArray& bundles);
+std::string jsonRecords(const std::vector<KSDictionary>& records);
 
 /// The error says what is wrong with which key, but not with which record.
 std::expected<KSEventPointer, KSError> eventFromJson(const KSValue& record);

@@ -69,9 +69,12 @@ class CommandLine {
                 [this](const Console& console) { return showBundles(console, words_); });
         addWindow(bundles);
         bundles->add_flag("--filtered", words_.filtered, "Only bundles that a rule made");
-        auto* trends = add(app_, "trends", "Analyze trends in the stored events, or in a file's",
-                           [this](const Console& console) { return showTrends(console, file_); });
+        auto* trends =
+            add(app_, "trends", "Yesterday beside four weeks of stored events, or of a file's",
+                [this](const Console& console) { return showTrends(console, file_, now_); });
         trends->add_option("FILE", file_, "JSON as \"events --json\" prints it; - for input");
+        trends->add_option("--now", now_, "What time it is for a daemon whose clock was set")
+            ->type_name("TIME");
     }
 
     void addWork() {
@@ -133,6 +136,7 @@ class CommandLine {
     Act chosen_;
     FetchWords words_;
     std::string file_;
+    std::string now_;
     std::string domain_;
     std::string key_;
     std::string value_;

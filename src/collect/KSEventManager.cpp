@@ -20,6 +20,7 @@
 #include "store/KSDefaultsManager.h"
 #include "store/KSEventStore.h"
 #include "store/KSPersistenceManager.h"
+#include "trends/KSTrendsAnalyzer.h"
 
 namespace keepsakes {
 
@@ -81,7 +82,8 @@ KSEventManager::KSEventManager(const PlatformServices& platform,
       eventStore_(std::move(eventStore)),
       sources_(std::move(sources)),
       queue_("KSEventManager"),
-      refreshQueue_("KSEventManager.deviceData") {}
+      refreshQueue_("KSEventManager.deviceData"),
+      metricsQueue_("KSEventManager.metrics") {}
 
 KSEventManager::~KSEventManager() = default;
 
@@ -283,12 +285,34 @@ void KSEventManager::clearEventsWithHandler(ResultHandler handler) {
 void KSEventManager::runAnalyticsWithHandler(ResultHandler handler) {
     whenAvailable(
         *persistenceManager(), queue_,
-        [handler] {
-            handler(KSError::make(KSErrorCode::analyticsPlansUnavailable,
-                                  "Analytics Plans are not avaialble"),
-                    {});
-        },
-        handler);
+        [this, handler = addingAvailability(handler)] { _runAnalytics(handler); }, handler);
+}
+
+void KSEventManager::_runAnalytics(const ResultHandler& handler) {
+    const auto analyzer = std::make_shared<KSTrendsAnalyzer>(platform_, sources_->vitalsManager());
+    const auto plans = analyzer->buildAnalyticsPlans();
+    if (plans.empty()) {
+        handler(KSError::make(KSErrorCode::analyticsPlansUnavailable,
+                              "Analytics Plans are not avaialble"),
+                {});
+        return;
+    }
+    const KSDateInterval window{plans.front()->trainDateInterval.start,
+                                plans.front()->testDateInterval.end};
+    fetchEventsWithOptions(
+        {.dateInterval = window, .ascending = true},
+        [this, analyzer, plans, handler](const KSEventArray& events, const OptionalError& error) {
+            if (error) {
+                handler(error, {});
+                return;
+            }
+            analyzer->analyzeEvents(
+                events, plans, [&](const KSEventArray& trends, const KSDictionary&) {
+                    eventStore_->storeEvents(trends, handler);
+                    metricsQueue_.async(
+                        [analyzer, trends] { analyzer->sendMetricsForTrendsEvents(trends); });
+                });
+        });
 }
 
 KSEventManager::EventGroups KSEventManager::splitEventArrayByCategory(const KSEventArray& events) {

@@ -53,7 +53,8 @@ class KSEventManager final : public KSService {
     /// Removes what expired, what is of unknown kind and what was deleted at its source.
     void cleanUpEventsWithHandler(ResultHandler handler);
     void clearEventsWithHandler(ResultHandler handler);
-    /// Answers error 5: there are no analytics plans in this version.
+    /// Looks for trends in the last four weeks of events and stores what it finds as events, whose
+    /// metrics follow later. Error 5 when there is no plan to follow.
     void runAnalyticsWithHandler(ResultHandler handler);
 
     void setProgressObserver(ProgressObserver observer);
@@ -74,6 +75,7 @@ class KSEventManager final : public KSService {
     void _fetchEventsWithOptions(const KSEventFetchOptions& options, const EventsHandler& handler);
     void _collectEvents(const ResultHandler& handler);
     void _collectEventsBetweenStartDate(KSDate start, KSDate end, const ResultHandler& handler);
+    void _runAnalytics(const ResultHandler& handler);
     void _cleanUpEvents(const ResultHandler& handler);
     void _purgeEventsDeletedAtSources(ResultHandler handler);
     void _rehydrateEvents(const KSEventArray& events, EventsHandler handler);
@@ -85,6 +87,7 @@ class KSEventManager final : public KSService {
     ProgressObserver progressObserver_;  // only on refreshQueue_
     WorkQueue queue_;
     WorkQueue refreshQueue_;  // waits for the scan of the owner's files
+    WorkQueue metricsQueue_;  // waits for the owner's age and sex
 };
 
 }  // namespace keepsakes

@@ -3,16 +3,28 @@
 
 #include <utility>
 
+#include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "sources/KSVitalsManager.h"
 
 namespace keepsakes {
 
+namespace {
+
+/// A trends event has the category of what it tells of, and no source.
+bool hasNoSource(const KSEventArray& group) {
+    return group.front()->provider() == KSEventProvider::postAnalytics;
+}
+
+}  // namespace
+
 EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
       routineServiceManager_(universe.service<KSRoutineServiceManager>("RoutineServiceManager")),
-      photoManager_(universe.service<KSPhotoManager>("PhotoManager")) {
+      photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
+      nowPlayingMediaManager_(
+          universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")) {
     if (vitalsManager_) {
         steps_.push_back({"resultWorkoutsSuccess",
                           [source = vitalsManager_](KSDate start, KSDate end, ResultHandler done) {
@@ -34,10 +46,21 @@ EventSources::EventSources(const ServiceLookup& universe)
                  source->fetchAndSavePhotoKeepsakesBetweenStartDate(start, end, done);
              }});
     }
+    if (nowPlayingMediaManager_) {
+        steps_.push_back(
+            {"resultMusicSuccess",
+             [source = nowPlayingMediaManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveRepeatedMediaPlayBetweenStartDate(start, end, std::move(done));
+             }});
+    }
 }
 
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
                                                      ResultHandler handler) const {
+    if (hasNoSource(group)) {
+        handler(std::nullopt, {});
+        return;
+    }
     switch (group.front()->category()) {
         case KSEventCategory::visit:
             if (routineServiceManager_) {
@@ -51,6 +74,13 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
                 return;
             }
             break;
+        case KSEventCategory::mediaOnRepeat:
+        case KSEventCategory::leisureMedia:
+            if (nowPlayingMediaManager_) {
+                nowPlayingMediaManager_->removeMediaPlayEventsDeletedAtSource(group, handler);
+                return;
+            }
+            break;
         default:
             break;
     }
@@ -59,6 +89,10 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
 
 void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
                                                   EventsHandler handler) const {
+    if (hasNoSource(group)) {
+        handler(group, std::nullopt);
+        return;
+    }
     switch (group.front()->category()) {
         case KSEventCategory::visit:
             if (routineServiceManager_) {
@@ -69,6 +103,13 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->rehydratePhotoKeepsakes(group, std::move(handler));
+                return;
+            }
+            break;
+        case KSEventCategory::mediaOnRepeat:
+        case KSEventCategory::leisureMedia:
+            if (nowPlayingMediaManager_) {
+                handler(nowPlayingMediaManager_->rehydratedMediaPlayEvents(group), std::nullopt);
                 return;
             }
             break;

@@ -12,6 +12,7 @@
 
 namespace keepsakes {
 
+class KSNowPlayingMediaManager;
 class KSPhotoManager;
 class KSRoutineServiceManager;
 class KSVitalsManager;
@@ -30,6 +31,9 @@ class EventSources {
 
     explicit EventSources(const ServiceLookup& universe);
 
+    /// Who answers for the owner's age and sex; may be missing.
+    const std::shared_ptr<KSVitalsManager>& vitalsManager() const { return vitalsManager_; }
+
     /// In the order of collection.
     const std::vector<CollectionStep>& collectionSteps() const { return steps_; }
 
@@ -44,6 +48,7 @@ class EventSources {
     std::shared_ptr<KSVitalsManager> vitalsManager_;
     std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
     std::shared_ptr<KSPhotoManager> photoManager_;
+    std::shared_ptr<KSNowPlayingMediaManager> nowPlayingMediaManager_;
     std::vector<CollectionStep> steps_;
 };
 

@@ -36,6 +36,8 @@ struct StandardFolders {
     std::filesystem::path configurationFile() const { return config / "config.toml"; }
     std::filesystem::path defaultsFolder() const { return config / "defaults"; }
     std::filesystem::path analyticsFile() const { return state / "analytics.jsonl"; }
+    /// When the background activities ran last.
+    std::filesystem::path activitiesFile() const { return state / "activities.plist"; }
 
     /// An error when a default is needed and there is no home folder.
     static std::expected<StandardFolders, KSError> find(

@@ -64,6 +64,7 @@ KSDate startOfDay(KSDate date) {
 
 int hours(KSDate date) { return field(date, UCAL_HOUR_OF_DAY); }
 int minutes(KSDate date) { return field(date, UCAL_MINUTE); }
+int weekday(KSDate date) { return field(date, UCAL_DAY_OF_WEEK); }
 
 int yearsBetween(KSDate from, KSDate to) {
     if (!std::isfinite(from.seconds) || !std::isfinite(to.seconds)) return 0;

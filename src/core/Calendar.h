@@ -18,6 +18,8 @@ KSDate startOfDay(KSDate date);
 
 int hours(KSDate date);
 int minutes(KSDate date);
+/// 1 Sunday to 7 Saturday.
+int weekday(KSDate date);
 
 /// Whole years from `from` to `to`, as birthdays are counted.
 int yearsBetween(KSDate from, KSDate to);

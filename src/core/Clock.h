@@ -33,20 +33,36 @@ class Clock {
 
     virtual KSDate now() const = 0;
 
-    /// Runs `task` on `queue` once, `delaySeconds` from now.
+    /// Seconds since an instant that stays the same while the process lives. Goes on while the
+    /// device sleeps, and is not moved when the displayed time is set.
+    virtual double elapsed() const = 0;
+
+    /// Runs `task` on `queue` once, `delaySeconds` from now. Time asleep does not count: a deadline
+    /// does not pass because the lid was closed.
     [[nodiscard]] Timer after(const WorkQueue& queue, double delaySeconds, Task task);
+
+    /// As `after`, with time asleep counted as `elapsed` does: what came due meanwhile runs when
+    /// the device wakes. It does not wake the device.
+    [[nodiscard]] Timer afterElapsed(const WorkQueue& queue, double delaySeconds, Task task);
 
     /// Waits for a signal, at most `seconds`; whether it came.
     bool wait(Semaphore& semaphore, double seconds);
 
   protected:
+    enum class Counting { awake, elapsed };
+
     /// Calls `fire` once, on the clock's own thread, `delaySeconds` from now; `fire` is brief. The
     /// answer drops it when called before that.
-    virtual std::function<void()> schedule(double delaySeconds, std::function<void()> fire) = 0;
+    virtual std::function<void()> schedule(Counting counting, double delaySeconds,
+                                           std::function<void()> fire) = 0;
+
+  private:
+    Timer scheduleOn(const WorkQueue& queue, Counting counting, double delaySeconds, Task task);
 };
 
 /// The system's clock, optionally shifted so that it starts at a given instant and runs on from
-/// there. Delays are counted on the monotonic clock; its thread wakes only when one is due.
+/// there. Delays are counted on CLOCK_MONOTONIC, or with the time asleep on CLOCK_BOOTTIME; its
+/// thread wakes only when one is due. The constructors throw std::system_error.
 class SystemClock final : public Clock {
   public:
     SystemClock();
@@ -54,9 +70,11 @@ class SystemClock final : public Clock {
     ~SystemClock() override;
 
     KSDate now() const override;
+    double elapsed() const override;
 
   protected:
-    std::function<void()> schedule(double delaySeconds, std::function<void()> fire) override;
+    std::function<void()> schedule(Counting counting, double delaySeconds,
+                                   std::function<void()> fire) override;
 
   private:
     struct State;

@@ -91,12 +91,13 @@ OptionalError replaceFile(const std::filesystem::path& path, std::string_view co
 }
 
 OptionalError makePrivateFolder(const std::filesystem::path& path) {
-    std::error_code error;
-    std::filesystem::create_directories(path.parent_path(), error);
-    if (error) return posixError(error.value(), "create", path.parent_path());
-    if (::mkdir(path.c_str(), 0700) != 0 && errno != EEXIST) {
-        return posixError(errno, "create", path);
+    int failed = ::mkdir(path.c_str(), 0700) == 0 ? 0 : errno;
+    if (failed == ENOENT && path.has_relative_path()) {
+        if (auto error = makePrivateFolder(path.parent_path())) return error;
+        failed = ::mkdir(path.c_str(), 0700) == 0 ? 0 : errno;
     }
+    if (failed != 0 && failed != EEXIST) return posixError(failed, "create", path);
+    std::error_code error;
     if (!std::filesystem::is_directory(path, error)) return posixError(ENOTDIR, "use", path);
     return std::nullopt;
 }

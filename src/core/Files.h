@@ -19,7 +19,7 @@ std::expected<std::string, KSError> readFile(const std::filesystem::path& path,
 /// Replaces the file whole or not at all: written beside it, flushed to disk, renamed. Mode 0600.
 OptionalError replaceFile(const std::filesystem::path& path, std::string_view content);
 
-/// Makes the folder, and those above it, where missing; the folder itself has mode 0700.
+/// Makes the folder, and those above it, where missing, each with mode 0700 as XDG asks.
 OptionalError makePrivateFolder(const std::filesystem::path& path);
 
 /// An error of `kPosixErrorDomain`: "<what> <path>: <text of the errno>".

@@ -2,7 +2,9 @@
 #pragma once
 
 #include <memory>
+#include <string>
 #include <string_view>
+#include <vector>
 
 namespace keepsakes {
 
@@ -12,6 +14,10 @@ struct PlatformServices;
 class KSService {
   public:
     virtual ~KSService() = default;
+
+    /// What a diagnostic report says of it, a line each: its state and counts, nothing of the
+    /// owner's life. Any thread may ask; it waits for no queue.
+    virtual std::vector<std::string> diagnosticLines() const { return {}; }
 };
 
 /// How one service finds another, by name, in its own initialiser and only what was made before

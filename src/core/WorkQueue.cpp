@@ -112,7 +112,26 @@ void WorkerThreads::endWaiting() {
 }
 
 struct WorkQueue::State : std::enable_shared_from_this<State> {
-    explicit State(std::string name) : label(std::move(name)) {}
+    explicit State(std::string name) : label(std::move(name)) {
+        const std::lock_guard lock(allMutex());
+        all().push_back(this);
+    }
+    ~State() {
+        const std::lock_guard lock(allMutex());
+        std::erase(all(), this);
+    }
+    State(const State&) = delete;
+    State& operator=(const State&) = delete;
+
+    // Never destroyed, since queues may outlive what is. Taken before a queue's own mutex.
+    static std::mutex& allMutex() {
+        static auto* mutex = new std::mutex();
+        return *mutex;
+    }
+    static std::vector<State*>& all() {
+        static auto* states = new std::vector<State*>();
+        return *states;
+    }
 
     const std::string label;
     std::mutex mutex;
@@ -215,6 +234,16 @@ std::function<void(Task)> WorkQueue::detachedAppender() const {
     return [weak = std::weak_ptr(state_)](Task task) {
         if (auto state = weak.lock()) state->append(std::move(task));
     };
+}
+
+std::vector<WorkQueue::Report> WorkQueue::reports() {
+    std::vector<Report> reports;
+    const std::lock_guard lock(State::allMutex());
+    for (auto* state : State::all()) {
+        const std::lock_guard held(state->mutex);
+        reports.push_back({state->label, state->running, state->tasks.size()});
+    }
+    return reports;
 }
 
 }  // namespace keepsakes

@@ -5,6 +5,7 @@
 #include <functional>
 #include <memory>
 #include <string>
+#include <vector>
 
 namespace keepsakes {
 
@@ -64,6 +65,15 @@ class WorkQueue {
 
     /// An appender that outlives the queue: a task given to it after the queue's end is dropped.
     std::function<void(Task)> detachedAppender() const;
+
+    /// What a queue is doing at the moment.
+    struct Report {
+        std::string label;
+        bool isRunning = false;
+        std::size_t waiting = 0;  ///< Tasks behind the one that runs.
+    };
+    /// Of every queue in the process, oldest first.
+    static std::vector<Report> reports();
 
   private:
     struct State;

@@ -5,34 +5,31 @@
 
 #include <utility>
 
+#include "core/Log.h"
 #include "core/Problems.h"
 #include "daemon/MemoryRelease.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "devicedata/IndexedRoutineService.h"
+#include "devicedata/MediaStreamFile.h"
+#include "linux/ActivityTimers.h"
 #include "linux/AnalyticsLog.h"
+#include "linux/BusThread.h"
 #include "linux/IndexerProcess.h"
+#include "linux/LogindLockState.h"
+#include "linux/MediaWatcher.h"
 #include "linux/PropertyListDefaults.h"
+#include "linux/UPowerSources.h"
 #include "platform/DeviceState.h"
+#include "platform/SystemNotifications.h"
 
 namespace keepsakes {
 
 namespace {
 
 constexpr std::string_view kIndexFile = "deviceData.sqlite";
+constexpr std::string_view kMediaStreamFile = "mediaStream.sqlite";
 constexpr std::string_view kIndexerProgram = "keepsakes-indexer";
-
-class ConfiguredPolicy final : public DevicePolicy {
-  public:
-    ConfiguredPolicy(bool diagnostics, bool healthData)
-        : diagnostics_(diagnostics), healthData_(healthData) {}
-    bool diagnosticSubmissionAllowed() const override { return diagnostics_; }
-    bool healthDataSubmissionAllowed() const override { return healthData_; }
-
-  private:
-    const bool diagnostics_;
-    const bool healthData_;
-};
 
 /// A device that does not lock its files away.
 class NoContentProtection final : public LockState {
@@ -40,7 +37,16 @@ class NoContentProtection final : public LockState {
     bool formattedForContentProtection() const override { return false; }
     bool unlockedSinceBoot() const override { return true; }
     int currentState() const override { return 0; }
+    Observation observe(const WorkQueue&, Task) override { return nullptr; }
 };
+
+/// logind is asked only where the owner wants the database to wait for it.
+std::unique_ptr<LockState> lockStateFor(const Configuration& configuration, BusThread& bus,
+                                        Problems& problems) {
+    if (!configuration.device.contentProtection) return std::make_unique<NoContentProtection>();
+    LogindLockState::Owner owner{::getuid(), processEnvironment()("XDG_SESSION_ID")};
+    return std::make_unique<LogindLockState>(bus, std::move(owner), problems);
+}
 
 OwnerFacts ownerFacts(const Configuration& configuration) {
     OwnerFacts facts;
@@ -51,11 +57,14 @@ OwnerFacts ownerFacts(const Configuration& configuration) {
     return facts;
 }
 
-/// The indexer lies beside the daemon's own program.
+/// The indexer lies beside the daemon's own program in a build folder, and in libexec when they are
+/// installed.
 std::filesystem::path indexerProgram() {
     std::error_code error;
-    const auto self = std::filesystem::read_symlink("/proc/self/exe", error);
-    return self.parent_path() / kIndexerProgram;
+    const auto folder = std::filesystem::read_symlink("/proc/self/exe", error).parent_path();
+    auto beside = folder / kIndexerProgram;
+    if (std::filesystem::exists(beside, error)) return beside;
+    return (folder / KEEPSAKES_LIBEXEC_FROM_BIN / kIndexerProgram).lexically_normal();
 }
 
 IndexerOptions indexerOptions(const Configuration& configuration, std::filesystem::path index) {
@@ -69,46 +78,93 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     return options;
 }
 
+/// Writes what the players play; nothing when it is not wanted or there is no bus.
+std::unique_ptr<MediaWatcher> mediaWatcher(bool wanted, MediaStreamFile& stream, Clock& clock) {
+    if (!wanted) return nullptr;
+    auto watcher = MediaWatcher::start(
+        [&stream, failing = false](const NowPlayingRecord& record) mutable {
+            const auto error = stream.append(record);
+            // Once for a streak: a full disk fails with every record.
+            if (error && !failing) logWarning(error->description());
+            failing = error.has_value();
+        },
+        [&clock] {
+            return Moment{clock.now(), awakeSeconds()};
+        });
+    if (watcher) return std::move(*watcher);
+    logWarning(watcher.error().description());
+    return nullptr;
+}
+
+std::vector<ActivityCriteria> activityCriteria(const Configuration& configuration) {
+    const auto& set = configuration.activities;
+    return {{"com.brindle.keepsakesd.eventCollection", set.collection, set.requireExternalPower},
+            {"com.brindle.keepsakesd.eventCompute", set.compute, set.requireExternalPower},
+            {"com.brindle.keepsakesd.eventPurge", set.purge, set.requireExternalPower}};
+}
+
 }  // namespace
 
 struct DevicePorts::Adapters {
-    Adapters(const Configuration& configuration, const StandardFolders& folders,
-             std::unique_ptr<Clock> clockToUse)
+    Adapters(const Configuration& configuration, ConfiguredPolicy::Load reload,
+             const StandardFolders& folders, std::unique_ptr<Clock> clockToUse)
         : clock(std::move(clockToUse)),
-          policy(configuration.policy.diagnostics, configuration.policy.healthData),
+          policy(configuration, std::move(reload), *clock, notifications, problems),
+          systemBus(BusThread::Bus::system, *clock),
+          lock(lockStateFor(configuration, systemBus, problems)),
+          power(systemBus),
           defaults(folders.defaultsFolder()),
           analytics(folders.analyticsFile(), *clock),
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           routine(folders.cache / kIndexFile, *clock),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
-          memory(*clock) {}
+          activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
+          media(folders.cache / kMediaStreamFile, *clock, problems),
+          memory(*clock),
+          watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {
+        systemBus.start();
+    }
+    ~Adapters() { systemBus.stop(); }
+    Adapters(const Adapters&) = delete;
+    Adapters& operator=(const Adapters&) = delete;
 
     std::unique_ptr<Clock> clock;
     Problems problems;
+    SystemNotifications notifications;
     ConfiguredPolicy policy;
-    NoContentProtection lock;
+    BusThread systemBus;
+    std::unique_ptr<LockState> lock;
+    UPowerSources power;
     PropertyListDefaults defaults;
     AnalyticsLog analytics;
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
     IndexedRoutineService routine;
     IndexerProcess deviceData;
+    ActivityTimers activities;
+    MediaStreamFile media;
     MemoryRelease memory;
+    std::unique_ptr<MediaWatcher> watcher;
 };
 
-DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolders& folders,
-                         std::unique_ptr<Clock> clock)
-    : adapters_(std::make_unique<Adapters>(configuration, folders, std::move(clock))) {
+DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::Load reload,
+                         const StandardFolders& folders, std::unique_ptr<Clock> clock)
+    : adapters_(
+          std::make_unique<Adapters>(configuration, std::move(reload), folders, std::move(clock))) {
     services_.clock = adapters_->clock.get();
     services_.devicePolicy = &adapters_->policy;
-    services_.lockState = &adapters_->lock;
+    services_.lockState = adapters_->lock.get();
+    services_.powerSources = &adapters_->power;
+    services_.systemNotifications = &adapters_->notifications;
     services_.userDefaults = &adapters_->defaults;
     services_.analytics = &adapters_->analytics;
     services_.healthStore = &adapters_->health;
     services_.photoAnalysis = &adapters_->photos;
     services_.routineService = &adapters_->routine;
+    services_.nowPlayingStream = &adapters_->media;
     services_.deviceData = &adapters_->deviceData;
+    services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;
     services_.requestEnded = [adapters = adapters_.get()] { adapters->memory.soon(); };
     services_.cacheFolder = folders.cache;
@@ -116,5 +172,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, const StandardFolde
 }
 
 DevicePorts::~DevicePorts() = default;
+
+ConfiguredPolicy& DevicePorts::policy() { return adapters_->policy; }
 
 }  // namespace keepsakes

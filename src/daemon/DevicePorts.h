@@ -6,6 +6,7 @@
 
 #include "config/Configuration.h"
 #include "core/Clock.h"
+#include "daemon/ConfiguredPolicy.h"
 #include "platform/PlatformServices.h"
 
 namespace keepsakes {
@@ -14,14 +15,18 @@ namespace keepsakes {
 /// services and outlives them.
 class DevicePorts {
   public:
-    DevicePorts(const Configuration& configuration, const StandardFolders& folders,
-                std::unique_ptr<Clock> clock);
+    /// `reload` reads the configuration again.
+    DevicePorts(const Configuration& configuration, ConfiguredPolicy::Load reload,
+                const StandardFolders& folders, std::unique_ptr<Clock> clock);
     ~DevicePorts();
     DevicePorts(const DevicePorts&) = delete;
     DevicePorts& operator=(const DevicePorts&) = delete;
 
     /// For the composition root to complete with the listener.
     PlatformServices& services() { return services_; }
+
+    /// For whoever watches the file of settings.
+    ConfiguredPolicy& policy();
 
   private:
     struct Adapters;

@@ -3,17 +3,25 @@
 
 #include <fmt/format.h>
 
+#include <functional>
 #include <ranges>
 #include <utility>
 
+#include "analytics/KSDaemonAnalyticsManager.h"
+#include "bundle/BundleRules.h"
 #include "bundle/KSEventBundleManager.h"
 #include "bundle/KSEventBundleStore.h"
 #include "collect/KSEventManager.h"
 #include "core/KSAssertion.h"
+#include "metrics/UsageMetrics.h"
 #include "notify/KSDaemonSPINotifier.h"
 #include "notify/KSTocsinNotifier.h"
 #include "platform/PlatformServices.h"
+#include "schedulers/KSEventCollectionScheduler.h"
+#include "schedulers/KSEventComputeScheduler.h"
+#include "schedulers/KSEventPurgeScheduler.h"
 #include "service/KSManageServer.h"
+#include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "sources/KSVitalsManager.h"
@@ -27,25 +35,47 @@ namespace {
 
 constexpr double kDisabledLifeSeconds = 10;
 
+KSEventBundleManager::MetricsObserver usageMetricsOf(const ServiceLookup& universe) {
+    std::vector<std::string> ruleNames;
+    for (const auto& rule : predicatesOfDesiredExperiences()) ruleNames.emplace_back(rule.name);
+    const auto metrics = UsageMetrics::initWithUniverse(universe, std::move(ruleNames));
+    return {std::bind_front(&UsageMetrics::submitMetricForEventBundle, metrics),
+            std::bind_front(&UsageMetrics::submitKSEventData, metrics)};
+}
+
 }  // namespace
 
 KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     : platform_(platform), exitQueue_("KSFeatureDisabledExit") {
     // Each may look up, while it is made, only what stands above it.
-    add("TocsinNotifier",
-        std::make_shared<KSTocsinNotifier>("TocsinNotifier", *platform.lockState));
+    add("TocsinNotifier", std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform));
     add("PersistenceManager", KSPersistenceManager::initWithUniverse(*this));
     add("EventBundleStore", KSEventBundleStore::initWithUniverse(*this));
     add("EventStore", KSEventStore::initWithUniverse(*this));
     add("PhotoManager", KSPhotoManager::initWithUniverse(*this));
     add("RoutineServiceManager", KSRoutineServiceManager::initWithUniverse(*this));
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
+    add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
     add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));
     add("EventManager", KSEventManager::initWithUniverse(*this));
-    add("EventBundleManager", KSEventBundleManager::initWithUniverse(*this));
+    const auto bundleManager = KSEventBundleManager::initWithUniverse(*this);
+    add("EventBundleManager", bundleManager);
+    bundleManager->setMetricsObserver(usageMetricsOf(*this));
     const auto server = KSManageServer::initWithUniverse(*this);
     add("Server", server);
     add("DaemonClientNotifier", server->getNotifier());
+    const auto& switches = platform.switches;
+    const auto collect =
+        KSEventCollectionScheduler::initWithUniverse(*this, switches.collectEnabled);
+    add("EventCollectionScheduler", collect);
+    add("EventCollectionSchedulerNotifier", collect->notifier());
+    const auto compute = KSEventComputeScheduler::initWithUniverse(*this, switches.computeEnabled);
+    add("EventComputeScheduler", compute);
+    add("EventComputeSchedulerNotifier", compute->notifier());
+    const auto purge = KSEventPurgeScheduler::initWithUniverse(*this, switches.purgeEnabled);
+    add("EventPurgeScheduler", purge);
+    add("EventPurgeSchedulerNotifier", purge->notifier());
+    add("DaemonAnalytics", KSDaemonAnalyticsManager::initWithUniverse(*this));
 }
 
 KSDaemonUniverse::~KSDaemonUniverse() {

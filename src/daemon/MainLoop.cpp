@@ -8,7 +8,6 @@
 #include <sys/signalfd.h>
 #include <unistd.h>
 
-#include <array>
 #include <cerrno>
 #include <csignal>
 #include <cstdint>
@@ -20,12 +19,11 @@ namespace keepsakes {
 
 MainLoop::MainLoop() {
     std::signal(SIGPIPE, SIG_IGN);
-    sigset_t ending;
-    sigemptyset(&ending);
-    sigaddset(&ending, SIGTERM);
-    sigaddset(&ending, SIGINT);
-    pthread_sigmask(SIG_BLOCK, &ending, nullptr);
-    signals_ = ::signalfd(-1, &ending, SFD_CLOEXEC | SFD_NONBLOCK);
+    sigset_t taken;
+    sigemptyset(&taken);
+    for (const int signal : {SIGTERM, SIGINT, SIGUSR1}) sigaddset(&taken, signal);
+    pthread_sigmask(SIG_BLOCK, &taken, nullptr);
+    signals_ = ::signalfd(-1, &taken, SFD_CLOEXEC | SFD_NONBLOCK);
     wake_ = ::eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
     if (signals_ < 0 || wake_ < 0) {
         throw std::system_error(errno, std::generic_category(), "main loop");
@@ -37,17 +35,33 @@ MainLoop::~MainLoop() {
     ::close(wake_);
 }
 
+void MainLoop::watch(int descriptor, std::function<void()> handler) {
+    watches_.emplace_back(descriptor, std::move(handler));
+}
+
 int MainLoop::run() {
-    std::array<pollfd, 2> sources = {{{signals_, POLLIN, 0}, {wake_, POLLIN, 0}}};
+    std::vector<pollfd> sources = {{signals_, POLLIN, 0}, {wake_, POLLIN, 0}};
+    const auto firstWatch = sources.size();
+    for (const auto& [descriptor, handler] : watches_) sources.push_back({descriptor, POLLIN, 0});
     while (status_ < 0) {
         if (::poll(sources.data(), sources.size(), -1) < 0 && errno != EINTR) return 1;
-        signalfd_siginfo info{};
-        if (::read(signals_, &info, sizeof info) == sizeof info) {
-            logInfo(fmt::format("ending on signal {}", info.ssi_signo));
-            stop(0);
+        if (sources[0].revents != 0) takeSignal();
+        for (std::size_t index = 0; index < watches_.size(); ++index) {
+            if (sources[firstWatch + index].revents != 0) watches_[index].second();
         }
     }
     return status_;
+}
+
+void MainLoop::takeSignal() {
+    signalfd_siginfo info{};
+    if (::read(signals_, &info, sizeof info) != sizeof info) return;
+    if (info.ssi_signo == SIGUSR1) {
+        report_();
+        return;
+    }
+    logInfo(fmt::format("ending on signal {}", info.ssi_signo));
+    stop(0);
 }
 
 void MainLoop::stop(int status) {

@@ -16,9 +16,12 @@
 #include "core/KSAssertion.h"
 #include "core/Log.h"
 #include "daemon/DevicePorts.h"
+#include "daemon/DiagnosticReport.h"
 #include "daemon/KSDaemonUniverse.h"
 #include "daemon/MainLoop.h"
 #include "daemon/ProgressReport.h"
+#include "linux/FileWatch.h"
+#include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/DeviceState.h"
 #include "store/KSPersistenceManager.h"
@@ -41,10 +44,17 @@ int refuse(std::string_view reason) {
     return EXIT_FAILURE;
 }
 
+std::filesystem::path configurationFile(const Arguments& arguments,
+                                        const StandardFolders& folders) {
+    return arguments.config.empty() ? folders.configurationFile()
+                                    : std::filesystem::path(arguments.config);
+}
+
+/// A file that was named has to be there; the owner's own need not.
 std::expected<Configuration, KSError> configurationOf(const Arguments& arguments,
                                                       const StandardFolders& folders) {
-    if (!arguments.config.empty()) return loadConfiguration(arguments.config);
-    return loadConfigurationIfAny(folders.configurationFile());
+    const auto file = configurationFile(arguments, folders);
+    return arguments.config.empty() ? loadConfigurationIfAny(file) : loadConfiguration(file);
 }
 
 /// The system's clock, or one that starts at the given time; without a zone that is the owner's.
@@ -89,12 +99,6 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     auto clock = clockStartingAt(arguments.now);
     if (!clock) return refuse(fmt::format("--now: \"{}\" is not an ISO 8601 time", arguments.now));
 
-    if (configuration->device.contentProtection) {
-        logWarning(
-            "content_protection: this version does not see the session's lock; the database "
-            "opens at once");
-    }
-
     auto listener = BusListener::claim();
     if (!listener) return refuse(listener.error().description());
     (*listener)->setDisconnectedHandler([&mainLoop] {
@@ -102,7 +106,15 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
         mainLoop.stop(EXIT_FAILURE);
     });
 
-    DevicePorts ports(*configuration, *folders, std::move(clock));
+    // Before anything else that the owner may change meanwhile.
+    FileWatch settings(configurationFile(arguments, *folders));
+    DevicePorts ports(
+        *configuration,
+        [arguments, folders = *folders] { return configurationOf(arguments, folders); }, *folders,
+        std::move(clock));
+    mainLoop.watch(settings.descriptor(), [&settings, &ports] {
+        if (settings.take()) ports.policy().fileChanged();
+    });
     auto& services = ports.services();
     services.listener = listener->get();
     // Asked and not used: health data decides nothing at start.
@@ -115,13 +127,18 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     connectSignals(*universe, **listener, *services.clock);
     universe->run(services.switches.anyEnabled, [&mainLoop] { mainLoop.stop(EXIT_SUCCESS); });
 
+    std::optional<DiagnosticReport> report(std::in_place, *universe);
+    mainLoop.setReportHandler([&report] { report->start(); });
+
     const int status = mainLoop.run();
 
     // First what feeds the services, then they themselves.
     const auto limit = limitOnEnding(*services.clock, endQueue);
     (*listener)->invalidate();
+    services.activities->stop();
     services.deviceData->stop();
     WorkerThreads::shared().settle();
+    report.reset();
     universe.reset();
     return status;
 }

@@ -18,11 +18,21 @@
 
 namespace keepsakes {
 
+namespace {
+
+bool isPowerOfTen(std::uint64_t number) {
+    while (number % 10 == 0 && number > 0) number /= 10;
+    return number == 1;
+}
+
+}  // namespace
+
 AnalyticsLog::AnalyticsLog(std::filesystem::path file, const Clock& clock)
     : file_(std::move(file)), clock_(clock), queue_("analytics log") {}
 
 AnalyticsLog::~AnalyticsLog() {
     queue_.sync([this] { closeFile(); });
+    if (dropped() > 0) logWarning(fmt::format("{} analytics events were dropped", dropped()));
 }
 
 void AnalyticsLog::send(std::string_view event, const KSDictionary& fields) {
@@ -54,9 +64,9 @@ void AnalyticsLog::flush() {
 }
 
 void AnalyticsLog::drop(const std::string& reason) {
-    ++dropped_;
-    if (!dropping_.exchange(true)) {
-        logWarning(fmt::format("analytics events are dropped: {}", reason));
+    const auto count = ++dropped_;
+    if (!dropping_.exchange(true) || isPowerOfTen(count)) {
+        logWarning(fmt::format("analytics events are dropped: {}; {} so far", reason, count));
     }
 }
 

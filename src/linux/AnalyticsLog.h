@@ -20,9 +20,10 @@ class Clock;
 /// order of sending, whole or not at all. Destroying it waits for what was sent. The clock must
 /// outlive it.
 ///
-/// What cannot be kept is dropped and counted, and the first drop of a streak is logged: a full
-/// disk or unusable folder, a backlog beyond `kLargestBacklog`, an event that JSON cannot hold (a
-/// number that is not finite, text that is not UTF-8) or that is longer than `kLongestLine`.
+/// What cannot be kept is dropped and counted: for want of room on the disk or of a usable folder,
+/// in a backlog beyond `kLargestBacklog`, and events that JSON cannot hold (a number that is not
+/// finite, text that is not UTF-8) or that are longer than `kLongestLine`. The log tells the count
+/// at the first drop of a streak, at every tenfold, when events are kept again, and at the end.
 class AnalyticsLog final : public AnalyticsService {
   public:
     /// A line that would take the file beyond this many bytes begins a new file; the old one is

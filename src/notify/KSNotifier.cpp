@@ -34,6 +34,10 @@ std::size_t KSNotifier::observerCount() {
     return count;
 }
 
+std::vector<std::string> KSNotifier::diagnosticLines() const {
+    return {enabled_ ? "somebody listens" : "nobody listens"};
+}
+
 void KSNotifier::registerDispatcher(const std::shared_ptr<KSDispatcher>& dispatcher,
                                     std::int32_t identifier) {
     queue_.sync([this, &dispatcher, identifier] {

@@ -38,6 +38,7 @@ class KSNotifier : public KSService {
     /// Whether a dispatcher is attached.
     bool isEnabled() const { return enabled_; }
     std::size_t observerCount();
+    std::vector<std::string> diagnosticLines() const override;
     WorkQueue& queue() { return queue_; }
 
   protected:

@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <functional>
+#include "core/Observers.h"
 
 namespace keepsakes {
 
-/// The owner's two opt-ins. Any thread may ask.
+/// The owner's two opt-ins. Any thread may ask. A change is announced by the notification
+/// `SystemNotifications::kEffectiveSettingsChanged`.
 class DevicePolicy {
   public:
     virtual ~DevicePolicy() = default;
@@ -14,6 +15,7 @@ class DevicePolicy {
 };
 
 /// Whether the device keeps its files locked until the owner's first unlock, and its lock state.
+/// Any thread may ask; an answer never waits.
 class LockState {
   public:
     virtual ~LockState() = default;
@@ -21,6 +23,8 @@ class LockState {
     virtual bool unlockedSinceBoot() const = 0;
     /// 0 unlocked, 1 locked, 2 locking; negative on error.
     virtual int currentState() const = 0;
+    /// Runs `changed` on `queue` after the lock state has changed, and after the first unlock.
+    [[nodiscard]] virtual Observation observe(const WorkQueue& queue, Task changed) = 0;
 };
 
 }  // namespace keepsakes

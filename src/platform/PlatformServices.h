@@ -7,15 +7,19 @@
 namespace keepsakes {
 
 class AnalyticsService;
+class BackgroundActivities;
 class BusListener;
 class Clock;
 class DeviceDataIndex;
 class DevicePolicy;
 class HealthStore;
 class LockState;
+class NowPlayingStream;
 class PhotoAnalysis;
+class PowerSources;
 class Problems;
 class RoutineService;
+class SystemNotifications;
 class UserDefaults;
 
 /// What the daemon may do by itself; fixed at start by the owner's diagnostics policy.
@@ -33,12 +37,16 @@ struct PlatformServices {
     Clock* clock = nullptr;
     DevicePolicy* devicePolicy = nullptr;
     LockState* lockState = nullptr;
+    PowerSources* powerSources = nullptr;
+    SystemNotifications* systemNotifications = nullptr;
     UserDefaults* userDefaults = nullptr;
     AnalyticsService* analytics = nullptr;
     HealthStore* healthStore = nullptr;
     PhotoAnalysis* photoAnalysis = nullptr;
     RoutineService* routineService = nullptr;
+    NowPlayingStream* nowPlayingStream = nullptr;
     DeviceDataIndex* deviceData = nullptr;
+    BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;
     Problems* problems = nullptr;
     /// The daemon's folder for the database and its property lists; made when missing.

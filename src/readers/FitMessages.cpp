@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cstring>
 #include <limits>
 
 #include "readers/ReaderLimits.h"
@@ -90,9 +91,7 @@ class FitBytes {
         while (done < into.size()) {
             if (at_ == filled_ && !refill()) return false;
             const auto count = std::min(into.size() - done, filled_ - at_);
-            std::ranges::transform(std::span(block_).subspan(at_, count),
-                                   into.begin() + static_cast<std::ptrdiff_t>(done),
-                                   [](char c) { return static_cast<std::uint8_t>(c); });
+            std::memcpy(into.subspan(done).data(), block_.data() + at_, count);
             done += count;
             at_ += count;
             position_ += count;
@@ -152,20 +151,19 @@ class FitParse {
     std::expected<std::optional<std::uint64_t>, std::string> header(bool isFirst) {
         const auto start = bytes_.position();
         std::array<std::uint8_t, 255> head{};
-        bytes_.restartChecksum();
         const auto rest = std::span(head);
-        if (!bytes_.take(rest.first(1))) {
-            if (isFirst && bytes_.error().empty()) return Failure("the file is empty");
-            return std::nullopt;
-        }
+        bytes_.restartChecksum();
+        const bool hasStart = bytes_.take(rest.first(kShortHeader));
+        const bool isEmpty = bytes_.position() == start;
         // Some writers fill the last block of their file with zeros.
-        if (!isFirst && head[0] == 0) return std::nullopt;
-        const bool cut = head[0] >= kShortHeader && !bytes_.take(rest.subspan(1, head[0] - 1U));
-        if (cut && !isFirst) return std::nullopt;
-        const std::string text(head.begin(), head.end());
-        if (cut || !isFitHeader(text)) {
-            return Failure(
-                fmt::format("byte {}: {}", start, cut ? "the header is cut" : "no FIT header"));
+        if (!isFirst && (!hasStart || head[0] == 0)) return std::nullopt;
+        if (isEmpty) return Failure("the file is empty");
+        if (hasStart && !isFitHeader(std::string(head.begin(), head.end()))) {
+            return Failure(fmt::format("byte {}: no FIT header", start));
+        }
+        if (!hasStart || !bytes_.take(rest.subspan(kShortHeader, head[0] - kShortHeader))) {
+            if (!isFirst) return std::nullopt;
+            return Failure(fmt::format("byte {}: the header is cut", start));
         }
         Checksum checksum;
         checksum.add(rest.first(kShortHeader));

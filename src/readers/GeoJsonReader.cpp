@@ -133,6 +133,7 @@ class GeoJson final : public JsonPlaces<Place> {
                 if (position_.size() < 2) position_.push_back(value.number);
                 break;
             case Place::time:
+                if (!value.text && !value.number) break;
                 feature_.hasTime = true;
                 feature_.time = timeAt(value);
                 break;
@@ -180,6 +181,7 @@ class GeoJson final : public JsonPlaces<Place> {
         if (feature_.time) {
             places_.point({*feature_.time, position, feature_.accuracyMeters});
         } else if (!feature_.hasTime && !feature_.name.empty()) {
+            times_.addPlace();
             const auto stated = useOfLabel(feature_.use);
             places_.place({.position = position,
                            .name = feature_.name,

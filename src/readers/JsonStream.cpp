@@ -23,7 +23,11 @@ class JsonBytes {
     }
     explicit JsonBytes(std::string_view document) : block_(document), ended_(true) {}
 
-    bool atEnd() { return at_ == block_.size() && !refill(); }
+    bool atEnd() {
+        wasEndSeen_ = at_ == block_.size() && !refill();
+        return wasEndSeen_;
+    }
+    bool wasEndSeen() const { return wasEndSeen_; }
     char current() const { return block_[at_]; }
     void advance() { ++at_; }
 
@@ -60,6 +64,7 @@ class JsonBytes {
     std::size_t before_ = 0;  // bytes of earlier blocks
     std::size_t held_ = 0;
     bool ended_ = false;
+    bool wasEndSeen_ = false;
     std::string error_;
 };
 
@@ -128,8 +133,9 @@ class SaxCalls {
         return true;
     }
     bool parse_error(std::size_t position, const std::string&, const std::exception&) {
-        error_ = bytes_.atEnd() ? fmt::format("byte {}: the document ends early", bytes_.position())
-                                : fmt::format("byte {}: not well-formed JSON", position);
+        error_ = bytes_.wasEndSeen()
+                     ? fmt::format("byte {}: the document ends early", bytes_.position())
+                     : fmt::format("byte {}: not well-formed JSON", position);
         return false;
     }
 

@@ -356,6 +356,7 @@ class LocationHistory final : public JsonPlaces<Place> {
     void tellFavourite() {
         const auto position = loose_.position();
         if (!position || loose_.use == PlaceUse::unknown) return;
+        times_.addPlace();
         places_.place({.position = *position,
                        .name = loose_.use == PlaceUse::home ? "Home" : "Work",
                        .use = loose_.use});

@@ -119,6 +119,7 @@ class Recording {
             const auto time = times_.take(message.time ? message.time : recorded);
             if (time) places_.point({time->date, *position, message.accuracyMeters});
         } else if (message.type == "waypoint" && !message.description.empty()) {
+            times_.addPlace();
             places_.place({.position = *position,
                            .name = message.description,
                            .use = useOfName(message.description)});

@@ -24,7 +24,10 @@ class TimeTally {
     /// The time when it could be read and is believed.
     std::optional<ParsedDate> take(const std::optional<ParsedDate>& parsed);
 
-    /// Why the file is refused: it has times, and not one is believed.
+    /// The file holds a place, which needs no time.
+    void addPlace() { ++taken_; }
+
+    /// Why the file is refused: it has times, and not one is believed, nor any place.
     std::optional<std::string> complaint() const;
 
   private:

@@ -3,6 +3,7 @@
 
 #include <fmt/format.h>
 
+#include <iterator>
 #include <mutex>
 #include <random>
 #include <utility>
@@ -15,6 +16,7 @@
 #include "notify/KSDaemonSPINotifier.h"
 #include "notify/KSWatchDog.h"
 #include "platform/PlatformServices.h"
+#include "trends/KSTrendsAnalyzer.h"
 
 namespace keepsakes {
 
@@ -28,6 +30,19 @@ void logTrends(const KSEventArray& events) {
     for (const auto& event : events) {
         if (event->trends) logDebug(KSValue(*event->trends).description());
     }
+}
+
+/// The error of a trend analysis, which names every plan's status; none when all plans came to a
+/// verdict.
+OptionalError errorOfStatuses(const KSDictionary& statuses) {
+    std::string text;
+    bool good = true;
+    for (const auto& [keyword, status] : statuses) {
+        fmt::format_to(std::back_inserter(text), "({}:{})", keyword, status.description());
+        good = good && KSTrendsAnalyzer::trendsfromAnalyticsResult(*status.asInteger()) != 0;
+    }
+    if (good) return std::nullopt;
+    return KSError::make(KSErrorCode::trendAnalysisFailed, text);
 }
 
 }  // namespace
@@ -82,7 +97,8 @@ KSDaemonClient::KSDaemonClient(const PlatformServices& platform,
       notifier_(std::make_shared<KSDaemonSPINotifier>("DaemonClient")),
       eventManager_(std::move(eventManager)),
       eventBundleManager_(std::move(eventBundleManager)),
-      queue_("KSDaemonClient") {}
+      queue_("KSDaemonClient"),
+      trendsQueue_("KSDaemonClient.trends") {}
 
 KSDaemonClient::~KSDaemonClient() = default;
 
@@ -206,15 +222,19 @@ void KSDaemonClient::runAnalytics(KSConduitContext context, Reply reply) {
     });
 }
 
-void KSDaemonClient::analyzeTrendsInEvents(KSEventArray, KSConduitContext context,
+void KSDaemonClient::analyzeTrendsInEvents(KSEventArray events, KSConduitContext context,
                                            EventsReply reply) {
-    const auto request = begin("AnalyzeTrends", context);
-    request->watchDog.pet();
-    if (reply) {
-        reply({}, KSError::make(KSErrorCode::analyticsPlansUnavailable,
-                                "Analytics Plans are not avaialble"));
-    }
-    request->watchDog.cancel();
+    // Not on the client's queue: other calls go out while many events are looked at.
+    trendsQueue_.async([this, events = std::move(events), request = begin("AnalyzeTrends", context),
+                        reply = std::move(reply)] {
+        const KSTrendsAnalyzer analyzer(platform_, nullptr);
+        analyzer.analyzeEvents(events, analyzer.buildAnalyticsPlans(),
+                               [&](KSEventArray trends, const KSDictionary& statuses) {
+                                   request->watchDog.pet();
+                                   if (reply) reply(std::move(trends), errorOfStatuses(statuses));
+                                   request->watchDog.cancel();
+                               });
+    });
 }
 
 void KSDaemonClient::fetchPhotoAnalyticsMetrics(KSConduitContext context, DictionaryReply reply) {

@@ -46,7 +46,7 @@ class KSDaemonClient final : public KSKeepsakesConduitProtocol {
     void bundleEvents(KSConduitContext context, Reply reply) override;
     void purgeEvents(KSConduitContext context, Reply reply) override;
     void runAnalytics(KSConduitContext context, Reply reply) override;
-    /// Answers error 5: there are no analytics plans in this version.
+    /// Error 0, which names every plan's verdict, unless all of them are low, normal or high.
     void analyzeTrendsInEvents(KSEventArray events, KSConduitContext context,
                                EventsReply reply) override;
     void fetchPhotoAnalyticsMetrics(KSConduitContext context, DictionaryReply reply) override;
@@ -63,6 +63,7 @@ class KSDaemonClient final : public KSKeepsakesConduitProtocol {
     const std::shared_ptr<KSEventManager> eventManager_;
     const std::shared_ptr<KSEventBundleManager> eventBundleManager_;
     WorkQueue queue_;
+    WorkQueue trendsQueue_;
 };
 
 }  // namespace keepsakes

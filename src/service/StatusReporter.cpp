@@ -32,18 +32,21 @@ DaemonStatus StatusReporter::withoutCounts() const {
 }
 
 void StatusReporter::status(std::function<void(DaemonStatus)> reply) {
-    auto status = withoutCounts();
-    if (!status.databaseAvailable) {
-        reply(std::move(status));
-        return;
-    }
-    persistenceManager_->performBlock(
-        [status = std::move(status), reply = std::move(reply)](ManagedObjectContext& context) {
-            auto counted = status;
-            counted.eventCount = context.countOf("KSEventMO");
-            counted.bundleCount = context.countOf("KSEventBundleMO");
-            reply(std::move(counted));
+    queue_.async([this, reply = std::move(reply)] {
+        // Whoever asks first is told what a request would find, which opens the database.
+        persistenceManager_->checkAvailabilityWithCompletionHandler(
+            [](bool, const OptionalError&) {});
+        auto status = withoutCounts();
+        if (!status.databaseAvailable) {
+            reply(std::move(status));
+            return;
+        }
+        persistenceManager_->performBlock([status, reply](ManagedObjectContext& context) mutable {
+            status.eventCount = context.countOf("KSEventMO");
+            status.bundleCount = context.countOf("KSEventBundleMO");
+            reply(std::move(status));
         });
+    });
 }
 
 }  // namespace keepsakes

@@ -3,6 +3,7 @@
 
 #include <memory>
 
+#include "core/WorkQueue.h"
 #include "wire/KSKeepsakesConduitProtocol.h"
 
 namespace keepsakes {
@@ -24,6 +25,7 @@ class StatusReporter final : public StatusSource {
 
     const PlatformServices& platform_;
     const std::shared_ptr<KSPersistenceManager> persistenceManager_;
+    WorkQueue queue_{"StatusReporter"};
 };
 
 }  // namespace keepsakes

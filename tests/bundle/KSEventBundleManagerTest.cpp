@@ -105,7 +105,7 @@ TEST_F(Bundles, HandsMetricsTheirWindowsAfterARecentCollection) {
     std::vector<std::size_t> steps;
     std::vector<std::string> data;
     bundles->setMetricsObserver(
-        {[&steps](const KSEventArray& events, const auto& clusters, const auto&) {
+        {[&steps](double, const KSEventArray& events, const auto& clusters, const auto&) {
              steps.push_back(events.size() * 100 + clusters.size());
          },
          [&data, this](const KSEventArray& events, KSDate start, KSDate end, KSDate sub) {

@@ -62,6 +62,17 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
     EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
                                     KSEventCategory::topic)}),
               "A moment: Saturday 10:02 to 12:31");
+    const auto song = makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
+                                KSEventCategory::mediaOnRepeat);
+    song->mediaTitle = "Song";
+    song->mediaArtist = "Band";
+    song->mediaRepetitions = 3;
+    EXPECT_EQ(prompt("MediaOnRepeat", {song}),
+              "Played again and again: Song by Band (3 times), Saturday 10:02 to 12:31");
+    const auto film = makeEvent(2, start.seconds, end.seconds, KSEventProvider::foresight,
+                                KSEventCategory::leisureMedia);
+    film->mediaTitle = "Film";
+    EXPECT_EQ(prompt("", {film}), "Watched or listened to: Film, Saturday 10:02 to 12:31");
 }
 
 TEST(PromptLanguage, HasASentenceForEveryRule) {

@@ -15,7 +15,10 @@
 #include "core/Json.h"
 #include "support/FakeConduit.h"
 #include "support/SampleRecords.h"
+#include "support/SampleWeeks.h"
 #include "support/TemporaryFolder.h"
+#include "support/TestPlatform.h"
+#include "trends/KSTrendsAnalyzer.h"
 #include "wire/BusListener.h"
 
 namespace keepsakes {
@@ -166,7 +169,6 @@ TEST_F(KeepsakesctlTest, TheJsonFormIsStableAndGoesBackIn) {
     EXPECT_EQ(run("events --json").output, json.output);
     EXPECT_EQ(run("store - --json <" + path("events.json")).output,
               "{\"events\":2,\"bundles\":0}\n");
-    EXPECT_THAT(run("trends " + path("events.json")).output, HasSubstr("2 events"));
 }
 
 TEST_F(KeepsakesctlTest, AnExportIsImportedAgain) {
@@ -201,11 +203,106 @@ TEST_F(KeepsakesctlTest, TablesShowLocalTimesAndBundlesTheirEvents) {
     conduit_.setBundles({samples::bundle({workout})});
     const auto events = run("events").output;
     EXPECT_THAT(events, HasSubstr("2023-03-08 22:26  22:56  "));
+    EXPECT_THAT(events, HasSubstr("Song, Artist, 17 times, 1 h 0 min"));
     EXPECT_THAT(events, HasSubstr("1 event\n"));
     EXPECT_THAT(events, Not(HasSubstr("\033")));
     const auto bundles = run("bundles").output;
     EXPECT_THAT(bundles, HasSubstr("A hike with photos\n  2023-03-08 22:26 to 22:56, by a rule\n"
                                    "  Start"));
+}
+
+/// Answers as the daemon does that counts days from `now`.
+FakeConduit::Analysis analysisAt(KSDate now) {
+    return [now](const KSEventArray& events) {
+        TestPlatform platform;
+        platform.clock.step(now - platform.clock.now());
+        const KSTrendsAnalyzer analyzer(platform.services, nullptr);
+        std::pair<KSEventArray, OptionalError> answer;
+        analyzer.analyzeEvents(
+            events, analyzer.buildAnalyticsPlans(),
+            [&answer](KSEventArray trends, const KSDictionary& statuses) {
+                std::string text;
+                for (const auto& [keyword, status] : statuses) {
+                    text += fmt::format("({}:{})", keyword, status.description());
+                }
+                answer.first = std::move(trends);
+                if (text.find(":1)") != std::string::npos) {
+                    answer = {{}, KSError::make(KSErrorCode::trendAnalysisFailed, text)};
+                }
+            });
+        return answer;
+    };
+}
+
+TEST_F(KeepsakesctlTest, TrendsAreShownWithTheirSeriesAndInWords) {
+    const auto now = parseISO8601("2024-06-16T20:00:00+02:00")->date;
+    const auto today = parseISO8601("2024-06-16T03:00:00+02:00")->date;
+    conduit_.analyzeWith(analysisAt(now));
+    conduit_.setEvents(samples::weeks(today.seconds));
+    const auto shown = run("trends");
+    EXPECT_EQ(shown.status, 0);
+    EXPECT_EQ(shown.output,
+              "Workouts\n"
+              "  more workout time than usual: 3 h against a median of 30 min\n"
+              "  ▂▂▃▂▂▃▂ ▂▃▂▂▃▂▂ ▃▂▂▃▂▂▃ ▂▂▃▂▂▃█  fences: up to 1 h 10 min; yesterday: 3 h\n"
+              "Time at work\n"
+              "  a usual time at work: 9 h against a median of 9 h\n"
+              "  ▇▇█▇▇█▇ ▇█▇▇█▇▇ █▇▇█▇▇█ ▇▇█▇▇█▇  fences: 5 h to 13 h; yesterday: 9 h\n"
+              "Leaving work\n"
+              "  left work at a usual time: 18:00 against a median of 18:00\n"
+              "  ▅▁█▅▁█▅ ▁█▅▁█▅▁ █▅▁█▅▁█ ▅▁█▅▁█▅  fences: 14:00 to 22:00; yesterday: 18:00\n"
+              "Media\n"
+              "  as much media played as usual: 20 min against a median of 20 min\n"
+              "  ▆▃█▆▃█▆ ▃█▆▃█▆▃ █▆▃█▆▃█ ▆▃█▆▃█▆  fences: up to 1 h; yesterday: 20 min\n"
+              "Contacts\n"
+              "  as much contact with others as usual: 2 against a median of 2\n"
+              "  ▆▃█▆▃█▆ ▃█▆▃█▆▃ █▆▃█▆▃█ ▆▃█▆▃█▆  fences: up to 6; yesterday: 2\n");
+    EXPECT_THAT(conduit_.calls(), ElementsAre("fetchEvents", "fetchEvents", "fetchEvents",
+                                              "fetchEvents", "analyzeTrends"));
+
+    folder_.write("weeks.json", run("events --json").output);
+    EXPECT_EQ(run("trends " + path("weeks.json")).output, shown.output);
+    const auto json = parseJson(run("trends --json").output);
+    ASSERT_TRUE(json && json->asArray() && json->asArray()->size() == 5u);
+    const auto& first = *json->asArray()->front().asDictionary();
+    EXPECT_EQ(valueForKey(first, "category"), KSValue(2));
+    EXPECT_TRUE(first.contains("startDateISO"));
+    const auto& analysis = *valueForKey(first, "analysis").asDictionary();
+    EXPECT_EQ(valueForKey(analysis, "days").asArray()->size(), 28u);
+    EXPECT_EQ(valueForKey(analysis, "days").asArray()->back(), KSValue(10800.0));
+    EXPECT_EQ(valueForKey(analysis, "upperFence"), KSValue(4200.0));
+    EXPECT_EQ(valueForKey(analysis, "verdict"), KSValue(6));
+}
+
+TEST_F(KeepsakesctlTest, TrendsWithoutEnoughDataSaySoAndWhatIsKnown) {
+    const auto now = parseISO8601("2024-06-16T20:00:00+02:00")->date;
+    auto events = samples::weeks(parseISO8601("2024-06-16T03:00:00+02:00")->date.seconds);
+    std::erase_if(events, [](const auto& event) {
+        return event->category() == KSEventCategory::leisureMedia;
+    });
+    std::erase_if(events, [now](const auto& event) {
+        return event->category() == KSEventCategory::visit && now - event->startDate() < 172800;
+    });
+    conduit_.analyzeWith(analysisAt(now));
+    conduit_.setEvents(events);
+    const auto shown = run("trends --now 2024-06-16T20:00:00+02:00");
+    EXPECT_EQ(shown.status, 1);
+    EXPECT_THAT(shown.output, HasSubstr("3 h against a median of 30 min"));
+    EXPECT_THAT(shown.output, HasSubstr("  no work yesterday, against a median of 18:00\n"));
+    EXPECT_THAT(shown.output, HasSubstr("  less time at work than usual: none against"));
+    EXPECT_THAT(shown.output, HasSubstr("Media\n  not enough data: 0 of the days"));
+    EXPECT_THAT(shown.output,
+                HasSubstr("keepsakesctl: (contact.interactions:5)(meida.playTime:1)"));
+
+    const auto elsewhere = run("trends --now 2024-01-01");
+    EXPECT_EQ(elsewhere.status, 1);
+    EXPECT_THAT(elsewhere.output, HasSubstr("Workouts\n  more workout time than usual\n"));
+    EXPECT_THAT(elsewhere.output, HasSubstr("Figures are left out"));
+    EXPECT_EQ(run("trends --now someday").status, 2);
+    EXPECT_EQ(run("trends /nonexistent.json").status, 1);
+    conduit_.analyzeWith(nullptr);
+    conduit_.failWith(KSError::make(KSErrorCode::databaseUnavailable, "no database"));
+    EXPECT_EQ(run("trends").output, "keepsakesctl: no database\n");
 }
 
 TEST_F(KeepsakesctlTest, DefaultsKeepTheirTypes) {

@@ -4,10 +4,13 @@
 #include <gmock/gmock.h>
 
 #include "StoreFixture.h"
+#include "model/KSExtensions.h"
+#include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
 #include "support/RecordedAssertions.h"
+#include "support/SampleWeeks.h"
 
 namespace keepsakes {
 namespace {
@@ -21,6 +24,8 @@ class Manager : public StoreFixture {
         universe->add("DefaultsManager", std::make_shared<KSDefaultsManager>(platform.defaults));
         universe->add("PhotoManager", KSPhotoManager::initWithUniverse(*universe));
         universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
+        universe->add("NowPlayingMediaManager",
+                      KSNowPlayingMediaManager::initWithUniverse(*universe));
         events = KSEventManager::initWithUniverse(*universe);
     }
 
@@ -116,6 +121,36 @@ TEST_F(Manager, FetchesInTheOrderAskedForWithDetailsFilledInAgain) {
                 ElementsAre("beach"));
 }
 
+TEST_F(Manager, MediaOfBothKindsAreTheirSourcesBusiness) {
+    for (const std::string title : {"Song", "Talk"}) {
+        const auto app = title == "Song" ? "player" : kLeisureMediaBundleId[1];
+        for (const double at : {-5000.0, -4000.0, -3000.0}) {
+            NowPlayingRecord record{.duration = 200, .title = title, .bundleID = std::string(app)};
+            record.absoluteTimestamp = now() + at + static_cast<double>(title.front());
+            platform.media.records.push_back(record);
+            record.playbackState = PlaybackState::paused;
+            record.absoluteTimestamp = record.absoluteTimestamp + 100;
+            platform.media.records.push_back(record);
+        }
+    }
+    EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
+              R"({"resultNumberOfEvents": 2, "stateDatabaseAvailable": true})");
+    KSEventArray filled;
+    events->fetchEventsWithOptions(
+        {}, [&filled](KSEventArray found, const OptionalError&) { filled = std::move(found); });
+    WorkerThreads::shared().settle();
+    ASSERT_EQ(filled.size(), 2u);
+    EXPECT_NE(filled[0]->category(), filled[1]->category());
+    for (const auto& event : filled) EXPECT_EQ(event->mediaRepetitions, 3);
+    std::erase_if(platform.media.records, [](const auto& each) { return each.title == "Talk"; });
+    run(&KSEventManager::cleanUpEventsWithHandler);
+    EXPECT_EQ(fetch({}).size(), 1u);
+    platform.media.nextError = KSError::make("Media", 1, "broken");
+    EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
+              R"({"resultMusicSuccess": false, "resultNumberOfEvents": 0, )"
+              R"("stateDatabaseAvailable": true})");
+}
+
 TEST_F(Manager, CleansWhatExpiredIsUnknownOrWasDeletedAtItsSource) {
     const auto expired = makeWorkout(1, 10, 20, "a");
     expired->expirationDate = now() - 1;
@@ -159,9 +194,59 @@ TEST_F(Manager, WithoutADatabaseEveryOperationSaysSo) {
         << "the next check tries again";
 }
 
-TEST_F(Manager, AnalyticsAnswersThatThereAreNoPlans) {
-    EXPECT_EQ(run(&KSEventManager::runAnalyticsWithHandler).error,
-              "Analytics Plans are not avaialble");
+TEST_F(Manager, AnalyticsKeepsOneEventOfEachTrendHoweverOftenItRuns) {
+    const auto trends = [this] {
+        std::map<std::string, KSUUID> byKeyword;
+        for (const auto& event : fetch({})) {
+            if (event->provider() != KSEventProvider::postAnalytics) continue;
+            byKeyword.emplace(*valueForKey(*event->trends, "keyword").asString(),
+                              event->eventIdentifier());
+        }
+        return byKeyword;
+    };
+    const auto today = KSExtensions::startOfDayWithBoundaryOfADay(now(), 10800);
+    // The store keeps workouts whole; what the other plans need comes from their sources.
+    storeAll(samples::weeks(today.seconds));
+    auto outcome = run(&KSEventManager::runAnalyticsWithHandler);
+    EXPECT_EQ(outcome.error, "");
+    EXPECT_EQ(outcome.result, R"({"resultNumberOfEvents": 5, "stateDatabaseAvailable": true})");
+    const auto first = trends();
+    EXPECT_EQ(first.size(), 5u);
+    std::map<std::string, std::string> verdicts;
+    for (const auto& [name, fields] : platform.analytics.take()) {
+        EXPECT_EQ(name, "com.brindle.Keepsakes.trends");
+        verdicts[*valueForKey(fields, "keyword").asString()] =
+            valueForKey(fields, "trends").description();
+    }
+    const std::map<std::string, std::string> expected{{"workout.duration", "6"},
+                                                      {"work.duration", "null"},
+                                                      {"work.exit", "null"},
+                                                      {"meida.playTime", "null"},
+                                                      {"contact.interactions", "null"}};
+    EXPECT_EQ(verdicts, expected);
+    platform.clock.advance(86400);
+    EXPECT_EQ(run(&KSEventManager::runAnalyticsWithHandler).error, "");
+    EXPECT_EQ(trends(), first);
+    EXPECT_EQ(platform.analytics.take().size(), 5u);
+}
+
+TEST_F(Manager, WhatAnAnalysisMadeHasNoSourceThatCouldLackIt) {
+    auto trend =
+        makeEvent(9, 10, 20, KSEventProvider::postAnalytics, KSEventCategory::photoKeepsake);
+    storeAll({trend});
+    EXPECT_EQ(run(&KSEventManager::cleanUpEventsWithHandler).result,
+              R"({"resultNumberOfEvents": 0, "stateDatabaseAvailable": true})");
+    events->fetchEventsWithOptions({}, [](const KSEventArray& found, const OptionalError&) {
+        EXPECT_EQ(numbersOf(found), (std::vector{9}));
+    });
+    WorkerThreads::shared().settle();
+}
+
+TEST_F(Manager, AnalyticsWithoutItsEventsSaysWhy) {
+    execute("DROP TABLE KSEventBundleMember; DROP TABLE KSEventMO");
+    const auto outcome = run(&KSEventManager::runAnalyticsWithHandler);
+    EXPECT_EQ(outcome.error, "database: no such table: KSEventMO");
+    EXPECT_TRUE(platform.analytics.take().empty());
 }
 
 TEST_F(Manager, NeedsItsServices) {

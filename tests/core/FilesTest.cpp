@@ -89,7 +89,9 @@ TEST(Files, PrivateFoldersAreMadeWithThoseAbove) {
     const auto made = folder / "a/b/c";
     EXPECT_FALSE(makePrivateFolder(made));
     EXPECT_FALSE(makePrivateFolder(made)) << "it exists already";
-    EXPECT_EQ(std::filesystem::status(made).permissions(), std::filesystem::perms(0700));
+    for (const auto& each : {made, made.parent_path(), folder / "a"}) {
+        EXPECT_EQ(std::filesystem::status(each).permissions(), std::filesystem::perms(0700));
+    }
     folder.write("file", "");
     EXPECT_EQ(makePrivateFolder(folder / "file")->code, ENOTDIR);
     EXPECT_EQ(makePrivateFolder(folder / "file/below")->code, ENOTDIR);

@@ -112,6 +112,51 @@ TEST(Clock, FiresInOrderAndDropsWhatIsCancelled) {
     EXPECT_THAT(seen, ElementsAre("early", "late"));
 }
 
+TEST(Clock, TimeAsleepCountsOnlyWhereItIsAskedFor) {
+    VirtualClock clock;
+    WorkQueue queue("q");
+    std::vector<std::string> seen;
+    const auto awake = clock.after(queue, 20, [&seen] { seen.push_back("awake"); });
+    const auto elapsed = clock.afterElapsed(queue, 30, [&seen] { seen.push_back("elapsed"); });
+    clock.advance(10);
+    clock.step(1000);
+    clock.suspend(15);
+    EXPECT_THAT(seen, ElementsAre());
+    EXPECT_EQ(clock.elapsed(), 25);
+    clock.suspend(1000);
+    EXPECT_THAT(seen, ElementsAre("elapsed"));
+    clock.advance(9.9);
+    EXPECT_THAT(seen, ElementsAre("elapsed"));
+    clock.advance(0.2);
+    EXPECT_THAT(seen, ElementsAre("elapsed", "awake"));
+}
+
+TEST(WorkQueue, TellsWhatEachQueueIsDoing) {
+    const auto reportOf = [](std::string_view label) {
+        auto reports = WorkQueue::reports();
+        std::erase_if(reports, [label](const auto& report) { return report.label != label; });
+        return reports;
+    };
+    {
+        WorkQueue queue("a queue of the report");
+        Semaphore gate;
+        Semaphore begun;
+        queue.async([gate, begun]() mutable {
+            begun.signal();
+            gate.wait();
+        });
+        queue.async([] {});
+        begun.wait();
+        const auto busy = reportOf(queue.label());
+        gate.signal();
+        ASSERT_EQ(busy.size(), 1u);
+        EXPECT_TRUE(busy[0].isRunning);
+        EXPECT_EQ(busy[0].waiting, 1u);
+    }
+    WorkerThreads::shared().settle();
+    EXPECT_TRUE(reportOf("a queue of the report").empty());
+}
+
 TEST(Clock, AWaitEndsWithTheSignalOrTheTime) {
     VirtualClock clock;
     WorkQueue queue("q");
@@ -139,6 +184,15 @@ TEST(Clock, TheSystemClockFiresAndStartsWhereItIsTold) {
     Semaphore fired;
     const auto timer = clock.after(queue, 0.001, [fired]() mutable { fired.signal(); });
     EXPECT_TRUE(clock.wait(fired, 60));
+    // One that is further off is pending already, and one is dropped.
+    const auto later = clock.afterElapsed(queue, 1000, [] { FAIL(); });
+    {
+        const auto dropped = clock.afterElapsed(queue, 0.0005, [] { FAIL(); });
+    }
+    const double before = clock.elapsed();
+    const auto sooner = clock.afterElapsed(queue, 0.001, [fired]() mutable { fired.signal(); });
+    EXPECT_TRUE(clock.wait(fired, 60));
+    EXPECT_GE(clock.elapsed(), before + 0.001);
     Semaphore never;
     EXPECT_FALSE(clock.wait(never, 0.001));
 }

@@ -14,6 +14,7 @@
 #include <thread>
 
 #include "client/ConduitClient.h"
+#include "support/MockService.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestEvents.h"
 
@@ -44,6 +45,14 @@ class DaemonProcess : public testing::Test {
 
     void configure(const std::string& deviceData) {
         folder.write("config/keepsakesd/config.toml", "[device_data]\n" + deviceData);
+    }
+
+    /// Waits until the log says so.
+    void waitForLog(const std::string& text) const {
+        while (log().find(text) == std::string::npos) {
+            ASSERT_EQ(waitpid(running, nullptr, WNOHANG), 0) << log();
+            std::this_thread::yield();
+        }
     }
 
     /// Starts a daemon whose log goes to a file; does not wait for it.
@@ -77,6 +86,16 @@ class DaemonProcess : public testing::Test {
         int status = 0;
         waitpid(child, &status, 0);
         return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
+    }
+
+    bool hasThread(const std::string& name) const {
+        const auto tasks = "/proc/" + std::to_string(running) + "/task";
+        for (const auto& task : std::filesystem::directory_iterator(tasks)) {
+            std::ifstream in(task.path() / "comm");
+            std::string comm;
+            if (in >> comm && comm == name) return true;
+        }
+        return false;
     }
 
     std::string log() const {
@@ -150,6 +169,34 @@ TEST_F(DaemonProcess, ADeletedTrackTakesItsVisitsAlongAtThePurge) {
     EXPECT_EQ(formatISO8601(left[0]->endDate()), "2024-06-15T10:20:00Z");
 }
 
+TEST_F(DaemonProcess, ASongOnRepeatBecomesABundle) {
+    startAndConnect();
+    SQLite::Database((folder / "cache/com.brindle.keepsakesd/mediaStream.sqlite").string(),
+                     SQLite::OPEN_READWRITE, 5000)
+        .exec(
+            "WITH plays(start) AS (VALUES (740217600), (740218000), (740219000)), "
+            "     states(state, after) AS (VALUES (1, 0), (2, 180)) "
+            "INSERT INTO records(timestamp, state, duration, title, artist) "
+            "SELECT start + after, state, 200, 'Song', 'Band' FROM plays, states "
+            "ORDER BY start, state");
+    ASSERT_FALSE(client->collectEvents());
+    ASSERT_FALSE(client->bundleEvents());
+    const auto bundles = client->fetchEventBundlesWithOptions({}).value();
+    ASSERT_EQ(bundles.size(), 1u);
+    EXPECT_THAT(*bundles[0]->promptLanguage,
+                HasSubstr("Played again and again: Song by Band (3 times), Sunday"));
+    EXPECT_EQ(bundles[0]->events[0]->mediaSumTimePlayed, 540);
+}
+
+TEST_F(DaemonProcess, ListensToPlayersUnlessTheOwnerSaysNo) {
+    for (const bool wanted : {true, false}) {
+        configure(std::string("tracks = []\nphotos = []\nmedia = ") + (wanted ? "true" : "false"));
+        startAndConnect();
+        EXPECT_EQ(hasThread("media"), wanted);
+        EXPECT_EQ(end(SIGTERM), 0);
+    }
+}
+
 TEST_F(DaemonProcess, SigtermDuringACollectionEndsInOrder) {
     for (int file = 0; file < 300; ++file) {
         folder.write("tracks/" + std::to_string(file) + ".gpx", kTrack);
@@ -178,6 +225,39 @@ TEST_F(DaemonProcess, ABadConfigurationIsNamedInOneLine) {
     configure("tracks = []\nfotos = []\n");
     EXPECT_EQ(exitStatusOf(start()), 1);
     EXPECT_THAT(log(), MatchesRegex("keepsakesd: [^\n]*config.toml:3: device_data.fotos:[^\n]*\n"));
+}
+
+TEST_F(DaemonProcess, StartsLockedAndOpensTheDatabaseWithTheUnlock) {
+    MockService::useSessionBusAsSystemBus();
+    MockLogind logind;
+    logind.startWithUser();
+    logind.addSession("c1", true, true);
+    configure("tracks = []\nphotos = []\n[device]\ncontent_protection = true\n");
+    startAndConnect();
+    EXPECT_FALSE(client->status()->databaseAvailable);
+    logind.end();
+    logind.startWithUser();
+    logind.addSession("c1", true, true);
+    EXPECT_FALSE(client->status()->databaseAvailable);
+    logind.setLocked("c1", false);
+    while (!client->status()->databaseAvailable) std::this_thread::yield();
+    EXPECT_EQ(end(SIGTERM), 0) << log();
+}
+
+TEST_F(DaemonProcess, ReportsWhatItIsDoingAndThatItsSettingsBroke) {
+    startAndConnect();
+    configure("tracks = []\nphotos = 3\n");
+    waitForLog("config.toml:3: device_data.photos");
+    kill(running, SIGUSR1);
+    waitForLog("report: ends");
+    const auto report = log();
+    for (const auto* text : {"report:   DaemonClientNotifier: nobody listens", "KSEventManager",
+                             "DiagnosticReport: running", "events 0, bundles 0", "problems 1",
+                             "the settings before it stay in force"}) {
+        EXPECT_THAT(report, HasSubstr(text));
+    }
+    EXPECT_EQ(client->status()->problems.size(), 1u);
+    EXPECT_EQ(end(SIGTERM), 0);
 }
 
 }  // namespace

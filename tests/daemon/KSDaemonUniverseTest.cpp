@@ -20,8 +20,11 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
     EXPECT_THAT(
         universe.serviceNames(),
         ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
-                    "PhotoManager", "RoutineServiceManager", "VitalsManager", "DefaultsManager",
-                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier"));
+                    "PhotoManager", "RoutineServiceManager", "VitalsManager", "NowPlayingMediaManager", "DefaultsManager",
+                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier",
+                    "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
+                    "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
+                    "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;
         EXPECT_EQ(universe.getService(name), universe.getService(name));

@@ -8,6 +8,7 @@
 
 #include <csignal>
 #include <limits>
+#include <regex>
 #include <string>
 #include <thread>
 #include <vector>
@@ -117,25 +118,36 @@ TEST_F(AnalyticsLogTest, KeepsTwoFilesOfBoundedSizeWithTheNewestEvents) {
     }
 }
 
-TEST_F(AnalyticsLogTest, AFullDiskDropsWholeLinesAndLogsOncePerStreak) {
-    AnalyticsLog log(file, clock);
-    log.send("fits", {});
-    log.flush();
+TEST_F(AnalyticsLogTest, AFullDiskDropsWholeLinesAndTellsTheCount) {
     testing::internal::CaptureStderr();
     {
-        const FileSizeLimit limit(std::filesystem::file_size(file) + 20);
-        for (int i = 0; i < 5; ++i) log.send("lost", {{"padding", std::string(100, 'x')}});
-        log.flush();
+        AnalyticsLog log(file, clock);
+        const auto sendAll = [&log](const char* event, int count) {
+            for (int i = 0; i < count; ++i) {
+                log.send(event, {{"padding", std::string(100, 'x')}});
+            }
+            log.flush();
+        };
+        const auto sendToFullDisk = [&](int count) {
+            const FileSizeLimit limit(std::filesystem::file_size(file) + 20);
+            sendAll("lost", count);
+        };
+        sendAll("fits", 50);  // more than is logged, which the limit holds for as well
+        sendToFullDisk(100);
+        sendAll("fits again", 1);
+        sendToFullDisk(2);
+        EXPECT_EQ(log.dropped(), 102u);
     }
-    log.send("fits again", {});
-    log.flush();
     const auto logged = testing::internal::GetCapturedStderr();
-    EXPECT_EQ(log.dropped(), 5u);
-    EXPECT_EQ(linesOf(file).size(), 2u);
-    const auto first = logged.find("events are dropped");
-    EXPECT_NE(first, std::string::npos);
-    EXPECT_EQ(logged.find("events are dropped", first + 1), std::string::npos) << logged;
-    EXPECT_THAT(logged, HasSubstr("5 were dropped"));
+    EXPECT_EQ(linesOf(file).size(), 51u);
+    std::vector<std::string> counts;
+    const std::regex told("([0-9]+) (so far|were dropped|analytics events were dropped)");
+    for (std::sregex_iterator at(logged.begin(), logged.end(), told), end; at != end; ++at) {
+        counts.push_back(at->str());
+    }
+    EXPECT_THAT(counts, ElementsAre("1 so far", "10 so far", "100 so far", "100 were dropped",
+                                    "101 so far", "102 analytics events were dropped"))
+        << logged;
 }
 
 TEST_F(AnalyticsLogTest, AnUnusablePlaceDropsAndNeverWaits) {

@@ -5,11 +5,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "Listener.h"
 #include "notify/KSDaemonSPINotifier.h"
-#include "notify/KSDispatcher.h"
 #include "notify/KSExampleNotifier.h"
-#include "notify/KSTocsinNotifier.h"
-#include "support/TestPlatform.h"
+#include "support/VirtualClock.h"
 
 namespace keepsakes {
 namespace {
@@ -29,25 +28,6 @@ class ObservedNotifier final : public KSNotifier {
     void onEnable() override { hooks.push_back("enable"); }
     void onDisable() override { hooks.push_back("disable"); }
 };
-
-class Listener {
-  public:
-    explicit Listener(std::shared_ptr<KSNotifier> notifier)
-        : dispatcher(KSDispatcher::initWithNotifier(std::move(notifier))) {}
-    ~Listener() { dispatcher->invalidate(); }
-
-    void hear(std::int32_t identifier, const std::string& name = "") {
-        dispatcher->registerForNotification(
-            identifier, [this, name](std::int32_t sent, const KSValue& payload) {
-                heard.push_back(fmt::format("{}{} {}", name, sent, payload.description()));
-            });
-    }
-
-    std::shared_ptr<KSDispatcher> dispatcher;
-    std::vector<std::string> heard;
-};
-
-void settle() { WorkerThreads::shared().settle(); }
 
 TEST(KSNotifier, DeliversToThoseWhoListenForTheIdentifier) {
     const auto notifier = std::make_shared<ObservedNotifier>("test");
@@ -123,36 +103,6 @@ TEST(KSExampleNotifier, TicksWhileSomebodyListens) {
     }
     clock.advance(5);
     EXPECT_EQ(clock.pendingCount(), 0u);
-}
-
-TEST(KSTocsinNotifier, TellsTheLockStateWhenItDiffersFromLocked) {
-    struct Row {
-        bool protects;
-        bool unlocked;
-        int current;
-        std::vector<std::string> heard;
-    };
-    const std::vector<std::string> both = {"3 {\"wasUnlocked\": true}", "2 {\"isUnlocked\": true}"};
-    const Row rows[] = {
-        {false, false, 1, both},
-        {true, true, 0, both},
-        {true, true, 1, {"3 {\"wasUnlocked\": true}"}},
-        {true, false, 2, {}},
-        {true, false, -1, {}},
-        {true, true, 7, {"3 {\"wasUnlocked\": true}"}},
-    };
-    for (const auto& row : rows) {
-        TestPlatform platform;
-        platform.lock.protects = row.protects;
-        platform.lock.unlocked = row.unlocked;
-        platform.lock.current = row.current;
-        const auto notifier = std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock);
-        Listener listener(notifier);
-        listener.hear(3);
-        settle();
-        listener.hear(2);
-        EXPECT_EQ(listener.heard, row.heard) << row.protects << row.current;
-    }
 }
 
 }  // namespace

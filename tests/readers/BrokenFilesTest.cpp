@@ -158,6 +158,18 @@ TEST(FileKind, IsToldByContent) {
                      24),
          FileKind::photo},
         {photo({}, ImageForm::png), FileKind::photo},
+        {std::string("\x0E\x10\x8C\0\0\0\0\0.FIT", 12), FileKind::fit},
+        {"2024-06-15T08:00:00Z\t*   \t{}", FileKind::ownTracks},
+        {"2024-06-15T08:00:00Z\tno kind", FileKind::unknown},
+        {" {\"locations\": [{\"latitudeE7\": 5, \"cut", FileKind::locationHistory},
+        {"\xEF\xBB\xBF{\"semanticSegments\": []}", FileKind::locationHistory},
+        {"{\"locations\": [{\"city\": \"Graz\"}]}", FileKind::unknown},
+        {"[{\"startTime\": \"\", \"visit\": {", FileKind::locationHistory},
+        {"{\"visit\": 7}", FileKind::unknown},
+        {"{\"name\": \"x\", \"type\": \"FeatureCollection\", ", FileKind::geoJson},
+        {"{\"features\": [{\"type\": \"Feature\", \"geometry\": {", FileKind::geoJson},
+        {"{\"type\": \"Topology\", \"objects\": {\"type\": \"Point\"}}", FileKind::unknown},
+        {"[1, 2, {\"type\": 3}]", FileKind::unknown},
         {"", FileKind::unknown},
     };
     for (const auto& [head, kind] : heads) {

@@ -6,12 +6,14 @@
 #include <set>
 
 #include "ManagersFixture.h"
+#include "model/KSExtensions.h"
 #include "model/ValueCoding.h"
 #include "notify/KSDaemonSPINotifier.h"
 #include "notify/KSDispatcher.h"
 #include "service/KSManageServer.h"
 #include "service/StatusReporter.h"
 #include "support/RecordedAssertions.h"
+#include "support/SampleWeeks.h"
 
 namespace keepsakes {
 namespace {
@@ -77,8 +79,7 @@ TEST_F(Client, AnnouncesWhatItDidAndForWhom) {
                                           [](const KSEventBundleArray&, const OptionalError&) {});
     WorkerThreads::shared().settle();
     EXPECT_EQ(errorOf([&](auto reply) { client().purgeEvents(context, reply); }), "");
-    EXPECT_EQ(errorOf([&](auto reply) { client().runAnalytics(context, reply); }),
-              "Analytics Plans are not avaialble");
+    EXPECT_EQ(errorOf([&](auto reply) { client().runAnalytics(context, reply); }), "");
     EXPECT_EQ(errorOf([&](auto reply) { client().clearEvents(context, reply); }), "");
     EXPECT_THAT(
         takeHeard(),
@@ -90,7 +91,8 @@ TEST_F(Client, AnnouncesWhatItDidAndForWhom) {
                     R"("triggerSource": "diary"})",
                     R"(4 {"resultNumberOfBundleEvents": 0, "resultNumberOfEvents": 0, )"
                     R"("stateDatabaseAvailable": true, "triggerSource": "diary"})",
-                    R"(5 {"resultOverallSuccess": false, "triggerSource": "diary"})"));
+                    R"(5 {"resultNumberOfEvents": 0, "stateDatabaseAvailable": true, )"
+                    R"("triggerSource": "diary"})"));
 }
 
 TEST_F(Client, AMissingReplyOrNameIsFine) {
@@ -121,6 +123,35 @@ TEST_F(Client, FailuresAreToldToCallerAndListeners) {
                                     });
     EXPECT_THAT(takeHeard(),
                 ElementsAre(R"(0 {"resultOverallSuccess": false, "triggerSource": "diary"})"));
+}
+
+TEST_F(Client, TrendsAreAnsweredWithTheStatusOfEachPlanUnlessAllAreKnown) {
+    const auto analyzed = [this](KSEventArray events) {
+        std::pair<std::size_t, std::string> answer{0, "(no answer)"};
+        client().analyzeTrendsInEvents(
+            std::move(events), {}, [&answer](const KSEventArray& trends, OptionalError error) {
+                answer = {trends.size(), error ? error->description() : ""};
+                EXPECT_EQ(error.value_or(KSError()).code, 0);
+            });
+        WorkerThreads::shared().settle();
+        return answer;
+    };
+    const auto today = KSExtensions::startOfDayWithBoundaryOfADay(platform.clock.now(), 10800);
+    auto events = samples::weeks(today.seconds);
+    EXPECT_EQ(analyzed(events), std::pair(std::size_t{5}, std::string()));
+    EXPECT_EQ(analyzed({}),
+              std::pair(std::size_t{0}, std::string("(contact.interactions:1)(meida.playTime:1)"
+                                                    "(work.duration:1)(work.exit:1)"
+                                                    "(workout.duration:1)")));
+    std::erase_if(events, [](const auto& event) {
+        return event->category() == KSEventCategory::leisureMedia;
+    });
+    EXPECT_EQ(analyzed(events),
+              std::pair(std::size_t{5}, std::string("(contact.interactions:5)(meida.playTime:1)"
+                                                    "(work.duration:5)(work.exit:5)"
+                                                    "(workout.duration:6)")));
+    EXPECT_THAT(takeHeard(), ElementsAre()) << "nobody is told";
+    EXPECT_TRUE(fetch({}).empty()) << "and nothing is stored";
 }
 
 TEST_F(Client, PhotoMetricsHaveAVersionAndASeedInRange) {

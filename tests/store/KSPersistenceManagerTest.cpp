@@ -37,7 +37,7 @@ TEST_F(Persistence, AnUnlockNoticeOfEitherValueOpens) {
     platform.lock.current = 1;
     close();
     universe = std::make_unique<TestUniverse>(platform.services);
-    const auto tocsin = std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock);
+    const auto tocsin = std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.services);
     universe->add("TocsinNotifier", tocsin);
     manager = KSPersistenceManager::initWithUniverse(*universe);
     tocsin->notify(KSTocsinNotifier::kIsUnlocked, KSDictionary{{"other", true}});

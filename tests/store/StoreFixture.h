@@ -30,7 +30,7 @@ class StoreFixture : public testing::Test {
         close();
         universe = std::make_unique<TestUniverse>(platform.services);
         universe->add("TocsinNotifier",
-                      std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock));
+                      std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.services));
         manager = KSPersistenceManager::initWithUniverse(*universe);
         universe->add("PersistenceManager", manager);
         store = KSEventStore::initWithUniverse(*universe);

@@ -3,8 +3,10 @@
 
 #include <algorithm>
 #include <condition_variable>
+#include <functional>
 #include <mutex>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "core/Semaphore.h"
@@ -55,6 +57,12 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
     KSEventBundleFetchOptions lastBundleOptions() const {
         const std::lock_guard lock(mutex_);
         return bundleOptions_;
+    }
+    /// What `analyzeTrendsInEvents` replies; without it, the events it was given.
+    using Analysis = std::function<std::pair<KSEventArray, OptionalError>(const KSEventArray&)>;
+    void analyzeWith(Analysis analysis) {
+        const std::lock_guard lock(mutex_);
+        analysis_ = std::move(analysis);
     }
     /// From now on replies wait on the queue until `release`.
     void hold() {
@@ -135,7 +143,13 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
         enqueue("analyzeTrends", [this, events = std::move(events), reply = std::move(reply)] {
             std::unique_lock lock(mutex_);
             const auto error = error_;
+            const auto analysis = analysis_;
             lock.unlock();
+            if (analysis) {
+                auto [trends, failed] = analysis(events);
+                reply(std::move(trends), std::move(failed));
+                return;
+            }
             reply(events, error);
         });
     }
@@ -192,6 +206,7 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
     KSEventFetchOptions eventOptions_;
     KSEventBundleFetchOptions bundleOptions_;
     Task working_;
+    Analysis analysis_;
     Semaphore gate_;
     WorkQueue queue_{"fake conduit"};
 };

@@ -113,6 +113,19 @@ void FakeRoutineService::fetchRoutineModeFromLocation(GeoPoint, std::function<vo
     });
 }
 
+void FakeNowPlayingStream::read(KSDate start, const EachRecord& each,
+                                const std::function<void(OptionalError)>& completion) {
+    asked.push_back(start);
+    if (nextError) {
+        completion(std::exchange(nextError, std::nullopt));
+        return;
+    }
+    for (const auto& record : records) {
+        if (record.absoluteTimestamp >= start) each(record);
+    }
+    completion(std::nullopt);
+}
+
 void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
     const std::lock_guard lock(mutex_);
     sent_.emplace_back(event, fields);
@@ -140,16 +153,86 @@ ScanReport FakeDeviceData::refresh(const Progress& progress) {
     return report;
 }
 
+namespace {
+
+class FakeRun final : public ActivityRun {
+  public:
+    explicit FakeRun(std::function<void(std::string_view)> atEnd) : atEnd_(std::move(atEnd)) {}
+    ~FakeRun() override { end("given up"); }
+    FakeRun(const FakeRun&) = delete;
+    FakeRun& operator=(const FakeRun&) = delete;
+    void finish() override { end("finished"); }
+
+  private:
+    void end(std::string_view how) {
+        if (!ended_.exchange(true)) atEnd_(how);
+    }
+
+    const std::function<void(std::string_view)> atEnd_;
+    std::atomic<bool> ended_ = false;
+};
+
+}  // namespace
+
+bool FakeActivities::fire(const std::string& identifier) {
+    ActivityBlock block;
+    {
+        const std::lock_guard lock(mutex_);
+        const auto found = blocks_.find(identifier);
+        if (found == blocks_.end()) return false;
+        block = found->second;
+    }
+    queue_.async([this, identifier, block] {
+        block(std::make_shared<FakeRun>([this, identifier](std::string_view how) {
+            const std::lock_guard lock(mutex_);
+            ends_.push_back(identifier + " " + std::string(how));
+        }));
+    });
+    return true;
+}
+
+std::vector<std::string> FakeActivities::takeEnds() {
+    const std::lock_guard lock(mutex_);
+    return std::exchange(ends_, {});
+}
+
+std::vector<std::string> FakeActivities::registered() const {
+    const std::lock_guard lock(mutex_);
+    std::vector<std::string> identifiers;
+    for (const auto& [identifier, block] : blocks_) identifiers.push_back(identifier);
+    return identifiers;
+}
+
+ActivityRegistration FakeActivities::schedulePreregistered(std::string_view identifier,
+                                                           ActivityBlock block) {
+    const std::string name(identifier);
+    {
+        const std::lock_guard lock(mutex_);
+        blocks_[name] = std::move(block);
+    }
+    return ActivityRegistration([this, name] {
+        {
+            const std::lock_guard lock(mutex_);
+            blocks_.erase(name);
+        }
+        if (!queue_.isCurrent()) queue_.sync([] {});
+    });
+}
+
 TestPlatform::TestPlatform() {
     services.clock = &clock;
     services.devicePolicy = &policy;
     services.lockState = &lock;
+    services.powerSources = &power;
+    services.systemNotifications = &notifications;
     services.userDefaults = &defaults;
     services.analytics = &analytics;
     services.healthStore = &health;
     services.photoAnalysis = &photos;
     services.routineService = &routine;
+    services.nowPlayingStream = &media;
     services.deviceData = &deviceData;
+    services.activities = &activities;
     services.problems = &problems;
     services.cacheFolder = folder / "cache";
     services.exitProcess = [this](int status) { exits.push_back(status); };

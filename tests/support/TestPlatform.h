@@ -14,13 +14,16 @@
 #include "core/ServiceLookup.h"
 #include "core/WorkQueue.h"
 #include "platform/AnalyticsService.h"
+#include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
-#include "platform/DeviceState.h"
 #include "platform/HealthStore.h"
+#include "platform/MediaStream.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
 #include "platform/RoutineService.h"
+#include "platform/SystemNotifications.h"
 #include "platform/UserDefaults.h"
+#include "support/FakeDeviceState.h"
 #include "support/TemporaryFolder.h"
 #include "support/VirtualClock.h"
 
@@ -94,6 +97,17 @@ class FakeRoutineService final : public RoutineService {
     WorkQueue queue_{"FakeRoutineService"};
 };
 
+/// A now-playing stream in memory, likewise.
+class FakeNowPlayingStream final : public NowPlayingStream {
+  public:
+    std::vector<NowPlayingRecord> records;
+    std::optional<KSError> nextError;
+    std::vector<KSDate> asked;
+
+    void read(KSDate start, const EachRecord& each,
+              const std::function<void(OptionalError)>& completion) override;
+};
+
 class FakeAnalytics final : public AnalyticsService {
   public:
     void send(std::string_view event, const KSDictionary& fields) override;
@@ -112,22 +126,6 @@ class FakeDefaults final : public UserDefaults {
                             const KSValue& value) override;
 };
 
-class FakeLockState final : public LockState {
-  public:
-    bool protects = false;
-    bool unlocked = false;
-    int current = 0;
-    bool formattedForContentProtection() const override { return protects; }
-    bool unlockedSinceBoot() const override { return unlocked; }
-    int currentState() const override { return current; }
-};
-
-class FakeDevicePolicy final : public DevicePolicy {
-  public:
-    bool diagnosticSubmissionAllowed() const override { return true; }
-    bool healthDataSubmissionAllowed() const override { return true; }
-};
-
 class FakeDeviceData final : public DeviceDataIndex {
   public:
     ScanReport report;
@@ -135,6 +133,27 @@ class FakeDeviceData final : public DeviceDataIndex {
     ScanReport refresh(const Progress& progress) override;
     ScanReport lastReport() const override { return report; }
     void stop() override {}
+};
+
+/// Activities that start when the test says so, on a queue of their own.
+class FakeActivities final : public BackgroundActivities {
+  public:
+    /// Starts a run; false when nothing is registered under the identifier.
+    bool fire(const std::string& identifier);
+    /// "<identifier> <finished or given up>" of each run that ended; forgets them.
+    std::vector<std::string> takeEnds();
+    std::vector<std::string> registered() const;
+
+    ActivityRegistration schedulePreregistered(std::string_view identifier,
+                                               ActivityBlock block) override;
+    std::string describe(std::string_view) const override { return "fired by the test"; }
+    void stop() override {}
+
+  private:
+    mutable std::mutex mutex_;
+    std::map<std::string, ActivityBlock> blocks_;
+    std::vector<std::string> ends_;
+    WorkQueue queue_{"FakeActivities"};
 };
 
 /// Everything the daemon needs of a device, in memory, with a folder of its own and a clock that
@@ -148,11 +167,15 @@ struct TestPlatform {
     FakeHealthStore health;
     FakePhotoAnalysis photos;
     FakeRoutineService routine;
+    FakeNowPlayingStream media;
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
+    FakePowerSources power;
+    SystemNotifications notifications;
     FakeDevicePolicy policy;
     FakeDeviceData deviceData;
+    FakeActivities activities;
     std::vector<int> exits;
     PlatformServices services;
 };
