@@ -70,7 +70,6 @@ std::string playedText(double repetitions, double seconds) {
 
 /// What tells one event from another of its kind.
 std::string detailsOf(const KSEvent& event) {
-    if (event.category() == KSEventCategory::visit) return visitDetails(event);
     std::string details;
     const auto add = [&details](const std::optional<std::string>& part) {
         if (!part || part->empty()) return;
@@ -78,7 +77,7 @@ std::string detailsOf(const KSEvent& event) {
         details += *part;
     };
     add(event.workoutType);
-    add(event.placeName);
+    add(event.category() == KSEventCategory::visit ? visitDetails(event) : event.placeName);
     add(event.suggestedEventTitle);
     add(event.tripTitle);
     add(event.mediaTitle);

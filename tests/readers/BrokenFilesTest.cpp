@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "RecordedPlaces.h"
+#include "PlaceFiles.h"
 #include "SampleFiles.h"
 #include "readers/TrackReader.h"
 
@@ -138,7 +138,7 @@ TEST(BrokenFiles, AFailingReadIsTheReason) {
     const ReadBlock fails = [](std::span<char>) -> std::expected<std::size_t, std::string> {
         return std::unexpected("read: Input/output error");
     };
-    RecordedPlaces places;
+    PlaceLines places;
     EXPECT_EQ(readTrack(fails, kReadOn, places).error(), "read: Input/output error");
     EXPECT_EQ(readPhotoFile(-1, kReadOn).error(), "stat: Bad file descriptor");
 }

@@ -11,7 +11,7 @@
 #include <span>
 #include <stdexcept>
 
-#include "RecordedPlaces.h"
+#include "PlaceFiles.h"
 #include "platform/ActivityCatalogue.h"
 
 namespace keepsakes {
@@ -116,7 +116,7 @@ std::string heif(const Exiv2::ExifData& exif, const std::string& xmp) {
 }  // namespace
 
 std::expected<FileRecords, std::string> readBytes(std::string_view bytes) {
-    RecordedPlaces places;
+    PlaceLines places;
     return readBytes(bytes, places);
 }
 
