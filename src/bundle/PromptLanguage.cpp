@@ -10,7 +10,10 @@
 #include <vector>
 
 #include "core/Calendar.h"
+#include "core/Text.h"
 #include "model/KSEventBundle.h"
+#include "trends/TrendWords.h"
+#include "trends/TrendsKeys.h"
 
 namespace keepsakes {
 
@@ -109,6 +112,9 @@ constexpr auto kRuleSubjects = std::to_array<Phrase>({
 /// What a cluster of nothing else but media is called.
 constexpr std::string_view kMediaSentence = "Watched or listened to";
 
+/// What a finding of an analysis is called.
+constexpr std::string_view kTrendSentence = "A trend";
+
 constexpr std::string_view kDay = "EEEE";
 constexpr std::string_view kTime = "HH:mm";
 
@@ -182,7 +188,22 @@ bool isMedia(const KSEventPointer& event) {
            event->category() == KSEventCategory::leisureMedia;
 }
 
+/// An event that an analysis made.
+bool isTrend(const KSEventPointer& event) {
+    return event->provider() == KSEventProvider::postAnalytics;
+}
+
+std::string trendText(const KSDictionary& trends) {
+    const auto* keyword = valueForKey(trends, trendskey::kKeyword).asString();
+    const auto& wording = trendWordingOf(keyword ? *keyword : std::string());
+    const auto code = valueForKey(trends, trendskey::kTrends).asInteger();
+    const auto verdict =
+        code ? static_cast<KSTrendsVerdict>(*code) : KSTrendsVerdict::notEnoughData;
+    return fmt::format("{}, {}", lowerCased(wording.title), wordsOf(wording, verdict));
+}
+
 std::string_view headline(const KSEventBundle& bundle) {
+    if (std::ranges::all_of(bundle.events, isTrend)) return kTrendSentence;
     if (const auto sentence = phraseOf(kRuleSentences, bundle.bundleType); !sentence.empty()) {
         return sentence;
     }
@@ -208,6 +229,7 @@ void addDistinct(std::vector<std::string>& texts, const std::optional<std::strin
 std::vector<std::string> titles(const KSEventBundle& bundle) {
     std::vector<std::string> texts;
     for (const auto& event : bundle.events) {
+        if (isTrend(event) && event->trends) addDistinct(texts, trendText(*event->trends));
         addDistinct(texts, event->workoutType);
         addDistinct(texts, event->placeName);
         addDistinct(texts, event->tripTitle);

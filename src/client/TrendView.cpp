@@ -9,6 +9,7 @@
 #include <utility>
 
 #include "client/RecordJson.h"
+#include "trends/TrendWords.h"
 
 namespace keepsakes {
 
@@ -19,38 +20,6 @@ constexpr std::size_t kDays = 28;
 constexpr std::size_t kDaysOfAWeek = 7;
 constexpr auto kBars = std::to_array<std::string_view>({"▁", "▂", "▃", "▄", "▅", "▆", "▇", "█"});
 constexpr std::string_view kNoBar = "·";
-
-enum class Unit { seconds, timeOfDay, count };
-
-/// How one plan is spoken of.
-struct Wording {
-    std::string_view keyword;
-    std::string_view title;
-    Unit unit;
-    std::string_view more;
-    std::string_view less;
-    std::string_view usual;
-};
-
-constexpr auto kWordings = std::to_array<Wording>({
-    {"workout.duration", "Workouts", Unit::seconds, "more workout time than usual",
-     "less workout time than usual", "a usual workout time"},
-    {"work.duration", "Time at work", Unit::seconds, "more time at work than usual",
-     "less time at work than usual", "a usual time at work"},
-    {"work.exit", "Leaving work", Unit::timeOfDay, "left work later than usual",
-     "left work earlier than usual", "left work at a usual time"},
-    {"meida.playTime", "Media", Unit::seconds, "more media played than usual",
-     "less media played than usual", "as much media played as usual"},
-    {"contact.interactions", "Contacts", Unit::count, "more contact with others than usual",
-     "less contact with others than usual", "as much contact with others as usual"},
-});
-constexpr Wording kOther = {"",        "Trend", Unit::count, "more than usual", "less than usual",
-                            "as usual"};
-
-const Wording& wordingOf(const KSTrendsAnalyzerOptions& plan) {
-    const auto* found = std::ranges::find(kWordings, plan.keyword, &Wording::keyword);
-    return found == kWordings.end() ? kOther : *found;
-}
 
 std::string timeSpan(double seconds) {
     if (seconds < 0) return "-" + timeSpan(-seconds);
@@ -63,13 +32,16 @@ std::string timeSpan(double seconds) {
     return fmt::format("{:.0f} h {:.0f} min", hours, minutes - 60 * hours);
 }
 
-std::string shown(Unit unit, double value) {
+std::string shown(TrendUnit unit, double value) {
     switch (unit) {
-        case Unit::seconds:
+        case TrendUnit::seconds:
             return timeSpan(value);
-        case Unit::timeOfDay:
-            return fmt::format("{:02.0f}:{:02.0f}", std::floor(value / 60), std::fmod(value, 60));
-        case Unit::count:
+        case TrendUnit::minutesOfDay: {
+            const double minutes = std::round(value);
+            const double hours = std::floor(minutes / 60);
+            return fmt::format("{:02.0f}:{:02.0f}", hours, minutes - 60 * hours);
+        }
+        case TrendUnit::count:
             break;
     }
     return value == 0 ? "none" : fmt::format("{:.6g}", value);
@@ -99,29 +71,16 @@ TrendView::TrendView(KSTrendsAnalyzerOptions::Pointer plan, const KSEventArray& 
 }
 
 std::string TrendView::words() const {
-    const auto& wording = wordingOf(*plan_);
-    std::string_view verdict;
-    switch (verdict_) {
-        case KSTrendsVerdict::highOutlier:
-            verdict = wording.more;
-            break;
-        case KSTrendsVerdict::lowOutlier:
-            verdict = wording.less;
-            break;
-        case KSTrendsVerdict::normal:
-            verdict = wording.usual;
-            break;
-        case KSTrendsVerdict::noUsableModel:
-            return "no verdict: too many of the days are alike";
-        default:
-            if (!findings_) return "not enough data";
-            return fmt::format("not enough data: {} of the days before yesterday, 3 are needed",
-                               findings_->train.size());
-    }
+    const auto& wording = trendWordingOf(plan_->keyword);
+    const auto verdict = wordsOf(wording, verdict_);
     if (!findings_) return std::string(verdict);
+    if (!findings_->result) {
+        return fmt::format("{}: {} of the 27 days before yesterday", verdict,
+                           findings_->train.size());
+    }
     const auto median = shown(wording.unit, findings_->model.q2());
     // An empty day counts as zero, and nobody left at midnight.
-    if (wording.unit == Unit::timeOfDay && findings_->test.front().count == 0) {
+    if (wording.unit == TrendUnit::minutesOfDay && findings_->test.front().count == 0) {
         return fmt::format("no work yesterday, against a median of {}", median);
     }
     return fmt::format("{}: {} against a median of {}", verdict,
@@ -151,7 +110,7 @@ std::vector<std::optional<double>> TrendView::days() const {
 std::string TrendView::barLine() const {
     const auto values = days();
     // A time of day is never near zero: there the earliest is the lowest bar.
-    const bool fromZero = wordingOf(*plan_).unit != Unit::timeOfDay;
+    const bool fromZero = trendWordingOf(plan_->keyword).unit != TrendUnit::minutesOfDay;
     double lowest = fromZero ? 0 : HUGE_VAL;
     double highest = fromZero ? 0 : -HUGE_VAL;
     for (const auto& value : values) {
@@ -172,7 +131,7 @@ std::string TrendView::barLine() const {
 
 std::string TrendView::fences() const {
     const auto& model = findings_->model;
-    const auto unit = wordingOf(*plan_).unit;
+    const auto unit = trendWordingOf(plan_->keyword).unit;
     const auto upper = shown(unit, model.upperFence());
     // No day is below nothing.
     if (model.lowerFence() <= 0) return "up to " + upper;
@@ -180,9 +139,9 @@ std::string TrendView::fences() const {
 }
 
 std::string TrendView::text(const Screen& screen) const {
-    const auto& wording = wordingOf(*plan_);
+    const auto& wording = trendWordingOf(plan_->keyword);
     auto text = screen.bold(wording.title) + "\n  " + words() + "\n";
-    if (!findings_) return text;
+    if (!findings_ || findings_->train.empty()) return text;
     text += "  " + barLine();
     if (findings_->result) {
         const auto& yesterday = findings_->test.front();

@@ -94,6 +94,7 @@ Timer limitOnEnding(Clock& clock, const WorkQueue& queue) {
 int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     const auto folders = StandardFolders::find();
     if (!folders) return refuse(folders.error().description());
+    FileWatch settings(configurationFile(arguments, *folders));  // misses nothing from here on
     const auto configuration = configurationOf(arguments, *folders);
     if (!configuration) return refuse(configuration.error().description());
     auto clock = clockStartingAt(arguments.now);
@@ -106,8 +107,6 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
         mainLoop.stop(EXIT_FAILURE);
     });
 
-    // Before anything else that the owner may change meanwhile.
-    FileWatch settings(configurationFile(arguments, *folders));
     DevicePorts ports(
         *configuration,
         [arguments, folders = *folders] { return configurationOf(arguments, folders); }, *folders,

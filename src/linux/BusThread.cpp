@@ -11,14 +11,19 @@
 #include <array>
 #include <atomic>
 #include <cerrno>
+#include <cstdlib>
 #include <ctime>
 #include <exception>
+#include <filesystem>
 #include <list>
+#include <optional>
+#include <string_view>
 #include <system_error>
 #include <thread>
 
 #include "core/Log.h"
 #include "linux/BusHandles.h"
+#include "linux/FileWatch.h"
 
 namespace keepsakes {
 
@@ -35,6 +40,19 @@ int openEvent() {
     const int descriptor = eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
     if (descriptor < 0) throw std::system_error(errno, std::generic_category(), "eventfd");
     return descriptor;
+}
+
+/// Where the system bus listens; nothing when that is not a plain path.
+std::optional<std::filesystem::path> systemBusSocket() {
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing in the daemon changes the environment
+    const char* set = std::getenv("DBUS_SYSTEM_BUS_ADDRESS");
+    std::string_view address = set ? set : "unix:path=/run/dbus/system_bus_socket";
+    constexpr std::string_view kPrefix = "unix:path=";
+    if (!address.starts_with(kPrefix)) return std::nullopt;
+    address = address.substr(kPrefix.size());
+    address = address.substr(0, address.find_first_of(",;"));
+    if (address.contains('%')) return std::nullopt;
+    return address;
 }
 
 /// Milliseconds until `due`, in microseconds of the monotonic clock.
@@ -111,6 +129,8 @@ class BusThread::Loop {
     int open();
     int subscribe(Following& following);
     void lose(int result);
+    bool waitsForSocket(int result);
+    void tryLater();
     void process();
     void wait();
     void wake() const { eventfd_write(wake_, 1); }
@@ -130,6 +150,7 @@ class BusThread::Loop {
     std::list<Following> followings_;
     std::list<PendingCall> pending_;
     double retrySeconds_ = kFirstRetrySeconds;
+    std::unique_ptr<FileWatch> socket_;  ///< While there is none to connect to.
 
     std::thread thread_;
     Timer retry_;  // only on timers_
@@ -203,11 +224,10 @@ int BusThread::Loop::subscribe(Following& following) {
                  &Loop::onSignal);
 }
 
-/// Drops the connection, tells the followers and tries again later.
+/// Drops the connection, tells the followers and sees to it that there is another attempt.
 void BusThread::Loop::lose(int result) {
-    logInfo(fmt::format("no {} bus ({}); trying again in {} s",
-                        bus_ == Bus::system ? "system" : "session",
-                        std::generic_category().message(-result), retrySeconds_));
+    logInfo(fmt::format("no {} bus: {}", bus_ == Bus::system ? "system" : "session",
+                        std::generic_category().message(-result)));
     pending_.clear();
     for (auto& following : followings_) {
         following.owner.reset();
@@ -215,6 +235,23 @@ void BusThread::Loop::lose(int result) {
         guarded([&following] { following.follower->becameUnavailable(); });
     }
     connection_.reset();
+    if (!waitsForSocket(result)) tryLater();
+}
+
+/// Whether the bus will be seen when it comes: a device without one is not to be woken for it.
+bool BusThread::Loop::waitsForSocket(int result) {
+    if (bus_ != Bus::system || result != -ENOENT) return false;
+    const auto path = systemBusSocket();
+    if (!path) return false;
+    socket_ = std::make_unique<FileWatch>(*path);
+    // It may have come just before it was watched.
+    std::error_code error;
+    if (socket_->descriptor() >= 0 && !std::filesystem::exists(*path, error)) return true;
+    socket_.reset();
+    return false;
+}
+
+void BusThread::Loop::tryLater() {
     timers_.async([this, delay = retrySeconds_] {
         if (isStopping_) return;
         retry_ = clock_.after(timers_, delay, [this] {
@@ -236,7 +273,8 @@ void BusThread::Loop::process() {
 }
 
 void BusThread::Loop::wait() {
-    std::array<pollfd, 2> descriptors = {{{wake_, POLLIN, 0}, {-1, 0, 0}}};
+    std::array<pollfd, 3> descriptors = {
+        {{wake_, POLLIN, 0}, {-1, 0, 0}, {socket_ ? socket_->descriptor() : -1, POLLIN, 0}}};
     int timeout = -1;
     if (connection_) {
         const int events = sd_bus_get_events(connection_.get());
@@ -252,6 +290,10 @@ void BusThread::Loop::wait() {
     ::poll(descriptors.data(), descriptors.size(), timeout);
     eventfd_t ignored = 0;
     if (descriptors[0].revents != 0) eventfd_read(wake_, &ignored);
+    if (descriptors[2].revents != 0 && socket_->take()) {
+        socket_.reset();
+        mayConnect_ = true;
+    }
 }
 
 void BusThread::Loop::call(const char* service, const char* path, const char* interface,

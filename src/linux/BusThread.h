@@ -41,8 +41,9 @@ struct BusReply {
 };
 
 /// A thread that follows services on a message bus: one connection, one poll loop, asynchronous
-/// calls only. A bus that is missing or goes away is tried again after a second, then after twice
-/// that and so on, at most an hour. The daemon owns it; followers and the clock outlive `stop`.
+/// calls only. A bus that is lost is tried again after a second, then after twice that and so on,
+/// at most an hour; a system bus that is not there is watched for, without any waking. The daemon
+/// owns it; followers and the clock outlive `stop`.
 class BusThread final {
   public:
     enum class Bus { session, system };

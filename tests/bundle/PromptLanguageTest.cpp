@@ -75,6 +75,18 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
     EXPECT_EQ(prompt("", {film}), "Watched or listened to: Film, Saturday 10:02 to 12:31");
 }
 
+TEST(PromptLanguage, TellsWhatAnAnalysisFound) {
+    const KSDate day = *calendar::dateOfDay(2024, 6, 15) + 3 * 3600;
+    const auto trend = makeEvent(1, day.seconds, (day + 86400).seconds,
+                                 KSEventProvider::postAnalytics, KSEventCategory::workout);
+    trend->trends = KSDictionary{{"keyword", "workout.duration"}, {"trends", 6}};
+    EXPECT_EQ(prompt("", {trend}),
+              "A trend: workouts, more workout time than usual, Saturday 03:00 to Sunday 03:00");
+    trend->trends = KSDictionary{{"keyword", "unheard of"}};
+    EXPECT_EQ(prompt("", {trend}),
+              "A trend: trend, not enough data, Saturday 03:00 to Sunday 03:00");
+}
+
 TEST(PromptLanguage, HasASentenceForEveryRule) {
     for (const auto& rule : predicatesOfDesiredExperiences()) {
         EXPECT_NE(prompt(std::string(rule.name), {makeWorkout(1, 1, 2, "x")}),

@@ -246,16 +246,16 @@ TEST_F(KeepsakesctlTest, TrendsAreShownWithTheirSeriesAndInWords) {
               "  more workout time than usual: 3 h against a median of 30 min\n"
               "  ▂▂▃▂▂▃▂ ▂▃▂▂▃▂▂ ▃▂▂▃▂▂▃ ▂▂▃▂▂▃█  fences: up to 1 h 10 min; yesterday: 3 h\n"
               "Time at work\n"
-              "  a usual time at work: 9 h against a median of 9 h\n"
+              "  nothing unusual: 9 h against a median of 9 h\n"
               "  ▇▇█▇▇█▇ ▇█▇▇█▇▇ █▇▇█▇▇█ ▇▇█▇▇█▇  fences: 5 h to 13 h; yesterday: 9 h\n"
               "Leaving work\n"
-              "  left work at a usual time: 18:00 against a median of 18:00\n"
+              "  nothing unusual: 18:00 against a median of 18:00\n"
               "  ▅▁█▅▁█▅ ▁█▅▁█▅▁ █▅▁█▅▁█ ▅▁█▅▁█▅  fences: 14:00 to 22:00; yesterday: 18:00\n"
               "Media\n"
-              "  as much media played as usual: 20 min against a median of 20 min\n"
+              "  nothing unusual: 20 min against a median of 20 min\n"
               "  ▆▃█▆▃█▆ ▃█▆▃█▆▃ █▆▃█▆▃█ ▆▃█▆▃█▆  fences: up to 1 h; yesterday: 20 min\n"
               "Contacts\n"
-              "  as much contact with others as usual: 2 against a median of 2\n"
+              "  nothing unusual: 2 against a median of 2\n"
               "  ▆▃█▆▃█▆ ▃█▆▃█▆▃ █▆▃█▆▃█ ▆▃█▆▃█▆  fences: up to 6; yesterday: 2\n");
     EXPECT_THAT(conduit_.calls(), ElementsAre("fetchEvents", "fetchEvents", "fetchEvents",
                                               "fetchEvents", "analyzeTrends"));
@@ -290,7 +290,8 @@ TEST_F(KeepsakesctlTest, TrendsWithoutEnoughDataSaySoAndWhatIsKnown) {
     EXPECT_THAT(shown.output, HasSubstr("3 h against a median of 30 min"));
     EXPECT_THAT(shown.output, HasSubstr("  no work yesterday, against a median of 18:00\n"));
     EXPECT_THAT(shown.output, HasSubstr("  less time at work than usual: none against"));
-    EXPECT_THAT(shown.output, HasSubstr("Media\n  not enough data: 0 of the days"));
+    EXPECT_THAT(shown.output,
+                HasSubstr("Media\n  not enough data: 0 of the 27 days before yesterday\nContacts"));
     EXPECT_THAT(shown.output,
                 HasSubstr("keepsakesctl: (contact.interactions:5)(meida.playTime:1)"));
 

@@ -251,7 +251,7 @@ TEST_F(DaemonProcess, ReportsWhatItIsDoingAndThatItsSettingsBroke) {
     kill(running, SIGUSR1);
     waitForLog("report: ends");
     const auto report = log();
-    for (const auto* text : {"report:   DaemonClientNotifier: nobody listens", "KSEventManager",
+    for (const auto* text : {"report:   DaemonClientNotifier: somebody listens", "KSEventManager",
                              "DiagnosticReport: running", "events 0, bundles 0", "problems 1",
                              "the settings before it stay in force"}) {
         EXPECT_THAT(report, HasSubstr(text));

@@ -46,7 +46,7 @@ class ScriptedPlayer {
 };
 
 /// Time stands at what the test says. Waiting is for the watcher, which handles what players say
-/// in their order; one that never does fails the test
+/// in their order; one that never does fails the test.
 class Watching : public testing::Test {
   protected:
     void watch() {

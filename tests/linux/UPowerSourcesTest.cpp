@@ -201,6 +201,22 @@ TEST_F(UPower, NonsenseChangesNothing) {
     EXPECT_EQ(next(), "10% Unknown (None) off, was off");
 }
 
+TEST_F(UPower, TheSystemBusIsFoundWhenItComes) {
+    const TemporaryFolder folder;
+    const auto socket = folder / "run/bus";
+    setenv("DBUS_SYSTEM_BUS_ADDRESS", ("unix:path=" + socket.string()).c_str(), 1);
+    startUPower();
+    bus.start();
+    ASSERT_TRUE(externalPowerChanges()) << "no bus, nothing that tells of power";
+    // The private bus, under the name that was waited for.
+    std::string address = getenv("DBUS_SESSION_BUS_ADDRESS");
+    address = address.substr(std::string("unix:path=").size());
+    std::filesystem::create_directory(socket.parent_path());
+    std::filesystem::create_symlink(address.substr(0, address.find(',')), socket);
+    EXPECT_EQ(next(), "50% Unknown (None) off, was off");
+    EXPECT_FALSE(power.hasExternalPower());
+}
+
 TEST_F(UPower, AServiceThatHangsIsWaitedForByNobody) {
     startUPower();
     upower.pause();
