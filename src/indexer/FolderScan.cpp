@@ -246,9 +246,9 @@ class Scan {
     }
 
     void readOpen(int fd, const ChangedFile& file, ReadOutcome& outcome) {
+        locations_.begin(file.knownId);
         try {
             outcome.hash = contentHash(fd, outcome.stamp.size).value_or("");
-            locations_.begin(file.knownId);
             auto records = reader_.read(fd, file.wanted, options_.latest, locations_);
             if (!records) {
                 outcome.refusal = {RefusalReason::damaged, std::move(records.error())};
@@ -263,7 +263,7 @@ class Scan {
         } catch (const std::exception& error) {
             outcome.refusal = {RefusalReason::damaged, error.what()};
         }
-        // Outside: what goes wrong with the index is not the file's fault.
+        // As `begin` outside: what goes wrong with the index is not the file's fault.
         locations_.finish();
     }
 

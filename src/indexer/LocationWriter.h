@@ -14,7 +14,7 @@
 namespace keepsakes {
 
 // What one file may hold; the rest is left out.
-inline constexpr std::uint64_t kMostStatedVisits = 200000;
+inline constexpr std::uint64_t kMostStatedVisits = 50000;
 inline constexpr std::uint64_t kMostNamedPlaces = 20000;
 /// A stay that a file states for more seconds than 31 days is none.
 inline constexpr double kLongestStatedVisit = 31 * kSecondsPerDay;

@@ -117,10 +117,6 @@ std::string heif(const Exiv2::ExifData& exif, const std::string& xmp) {
 
 std::expected<FileRecords, std::string> readBytes(std::string_view bytes) {
     PlaceLines places;
-    return readBytes(bytes, places);
-}
-
-std::expected<FileRecords, std::string> readBytes(std::string_view bytes, LocationSink& places) {
     const int fd = ::memfd_create("sample", MFD_CLOEXEC);
     if (fd < 0 || ::write(fd, bytes.data(), bytes.size()) != static_cast<ssize_t>(bytes.size())) {
         throw std::runtime_error("no memory file");

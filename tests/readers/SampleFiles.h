@@ -14,7 +14,6 @@ inline const ReaderContext kReadOn{parseISO8601("2024-06-20")->date};
 
 /// What the reader of the file's kind (by `kindOf`) makes of the bytes; the error otherwise.
 std::expected<FileRecords, std::string> readBytes(std::string_view bytes);
-std::expected<FileRecords, std::string> readBytes(std::string_view bytes, LocationSink& places);
 
 /// The records, or "error: <text>", as one line a record.
 std::string told(const std::expected<FileRecords, std::string>& records);
