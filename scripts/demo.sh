@@ -67,11 +67,13 @@ if [ "$stage" = start ]; then
     if [ ${#folders[@]} -eq 0 ]; then
         tracks=("$PWD/data/sample/tracks")
         photos=("$PWD/data/sample/photos")
+        places=("$PWD/data/sample/places")
         export TZ=Europe/Vienna
         now=2024-06-16T20:00:00+02:00
     else
         tracks=("${folders[@]}")
         photos=("${folders[@]}")
+        places=()
         echo "reading ${folders[*]}"
         "$bin/keepsakes-indexer" --index "$home/look.sqlite" --tracks "${tracks[@]}" \
             --photos "${photos[@]}" --human
@@ -93,6 +95,7 @@ if [ "$stage" = start ]; then
     # Assigned first: a failure inside the text below would go unnoticed.
     track_folders=$(toml_strings "${tracks[@]}")
     photo_folders=$(toml_strings "${photos[@]}")
+    place_folders=$(toml_strings ${places[@]+"${places[@]}"})
     mkdir -p "$XDG_CONFIG_HOME/keepsakesd"
     cat >"$XDG_CONFIG_HOME/keepsakesd/config.toml" <<EOF
 [device_data]
@@ -101,7 +104,7 @@ photos    = [$photo_folders]
 calendars = []
 messages  = []
 contacts  = []
-places    = []
+places    = [$place_folders]
 media     = false           # no player is on this bus
 [activities]                # nothing runs but what this script asks for
 collection = "0"

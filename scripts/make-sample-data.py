@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""Makes data/sample: the tracks and photos of an invented week that ends on Sunday, 2024-06-16.
+"""Makes data/sample: the tracks, places and photos of an invented week that ends on Sunday, 2024-06-16.
 
 Needs the exiv2 command line tool. The same call makes the same bytes.
 
@@ -10,6 +10,9 @@ The owner lives in Graz (Europe/Vienna, UTC+2 that week):
   Wednesday  a run (TCX), with photos of the baby and the dog on the way
   Thursday   a bike ride (GPX without a type)
   Friday     a birthday party in the evening
+  Friday to Sunday a phone's log of where the owner was (GPX): at home, at work, at the trailhead
+             and in an inn on Saturday, in a concert hall on Saturday night, at a lake on Sunday;
+             home, work, the inn and the hall are waypoints of the owner's
   Saturday   a hike (GPX), with photos
 and what she listened to that week, as records of the now-playing stream (CSV);
 and two files that cannot be read: a GPX file cut in the middle, a photo without a date.
@@ -27,6 +30,10 @@ from pathlib import Path
 LOCAL_OFFSET = timedelta(hours=2)
 HOME = (47.0790, 15.4500)
 SUMMIT = (47.2040, 15.4660)
+OFFICE = (47.0585, 15.4590)
+INN = (47.2065, 15.4672)
+HALL = (47.0708, 15.4446)
+LAKE = (46.6247, 14.1530)  # farther from home than the surroundings reach
 METRES_PER_DEGREE = 111195.0
 
 
@@ -100,6 +107,53 @@ def tcx(sport, points):
     return "\n".join(lines)
 
 
+STAYS = [
+    # place, from, to (UTC): what a phone writes, every quarter of an hour while it lies still
+    (HOME, "2024-06-13T22:10:00", "2024-06-14T05:40:00"),
+    (OFFICE, "2024-06-14T06:10:00", "2024-06-14T14:30:00"),
+    (HOME, "2024-06-14T15:00:00", "2024-06-15T07:10:00"),
+    (SUMMIT, "2024-06-15T07:40:00", "2024-06-15T08:00:00"),
+    (INN, "2024-06-15T10:34:00", "2024-06-15T11:50:00"),
+    (HOME, "2024-06-15T12:20:00", "2024-06-15T16:50:00"),
+    (HALL, "2024-06-15T17:15:00", "2024-06-15T20:40:00"),
+    (HOME, "2024-06-15T21:05:00", "2024-06-16T06:30:00"),
+    (LAKE, "2024-06-16T08:20:00", "2024-06-16T14:00:00"),
+    (HOME, "2024-06-16T15:50:00", "2024-06-16T17:50:00"),
+]
+PLACES = [("Zuhause", HOME), ("Arbeit", OFFICE), ("Gasthof Schöckl", INN), ("Konzerthaus", HALL)]
+
+
+def phone_log():
+    """Points of the stays, and a point a minute on the straight ways between them."""
+    points = []
+    for number, (place, start, end) in enumerate(STAYS):
+        time = utc(start)
+        while time <= utc(end):
+            wander = 1e-4 * math.sin(len(points) * 1.7)
+            points.append((time, place[0] + wander, place[1] - wander / 2, 400))
+            time += timedelta(minutes=15)
+        if number + 1 < len(STAYS) and STAYS[number + 1][0] != INN:  # the hike's own track
+            there, arrival = STAYS[number + 1][0], utc(STAYS[number + 1][1])
+            begin = utc(end)
+            for minute in range(1, int((arrival - begin).total_seconds() // 60), 3):
+                share = minute * 60 / (arrival - begin).total_seconds()
+                points.append((begin + timedelta(minutes=minute),
+                               place[0] + (there[0] - place[0]) * share,
+                               place[1] + (there[1] - place[1]) * share, 400))
+    return points
+
+
+def waypoints(places):
+    lines = [
+        '<?xml version="1.0" encoding="UTF-8"?>',
+        '<gpx version="1.1" creator="make-sample-data" xmlns="http://www.topografix.com/GPX/1/1">',
+    ]
+    for name, (latitude, longitude) in places:
+        lines.append(f'  <wpt lat="{latitude:.6f}" lon="{longitude:.6f}"><name>{name}</name></wpt>')
+    lines += ["</gpx>", ""]
+    return "\n".join(lines)
+
+
 def make_tracks(folder):
     folder.mkdir(parents=True, exist_ok=True)
     hike = walk(utc("2024-06-15T08:02:00"), utc("2024-06-15T10:31:00"), SUMMIT, 0.9, 60)
@@ -110,6 +164,7 @@ def make_tracks(folder):
     (folder / "2024-06-12-run.tcx").write_text(tcx("Running", run))
     (folder / "2024-06-13-ride.gpx").write_text(gpx("Feierabendrunde", None, ride))
     (folder / "2024-06-14-broken.gpx").write_text(hike_file[:1200])
+    (folder / "phone-2024-06-14-to-16.gpx").write_text(gpx("Handy", None, phone_log()))
 
 
 # Images: a gradient of 64 x 48 pixels, of a colour of its own for each photo.
@@ -257,6 +312,9 @@ PHOTOS = [
      None, None),
     ("party-5.png", "2024-06-14 21:15:30", "offset", HOME, ["birthday", "Feier"], [],
      "Jakob Muster", None),
+    ("concert-1.jpg", "2024-06-15 20:12:00", "offset", HALL, ["concert"], [], None, None),
+    ("concert-2.jpg", "2024-06-15 21:47:30", "offset", HALL, ["Konzert"], [], "Anna Beispiel",
+     None),
 ]
 
 
@@ -268,7 +326,12 @@ def make_photos(folder):
         commands = metadata(utc(local), zone, place, keywords, hierarchy, person, event)
         arguments = [part for command in commands for part in ("-M", command)]
         subprocess.run(["exiv2", *arguments, str(path)], check=True)
-    (folder / "undated.jpg").write_bytes(jpeg(len(PHOTOS)))
+    (folder / "undated.jpg").write_bytes(jpeg(14))
+
+
+def make_places(folder):
+    folder.mkdir(parents=True, exist_ok=True)
+    (folder / "places.gpx").write_text(waypoints(PLACES))
 
 
 # What was played
@@ -309,6 +372,7 @@ def main():
     beside = Path(__file__).resolve().parent.parent / "data" / "sample"
     folder = Path(sys.argv[1]) if len(sys.argv) > 1 else beside
     make_tracks(folder / "tracks")
+    make_places(folder / "places")
     make_photos(folder / "photos")
     make_plays(folder / "media")
 

@@ -61,6 +61,11 @@ constexpr auto kClusterSentences = std::to_array<ClusterSentence>({
     {false, false, false, "A moment"},
 });
 
+/// What visits alone are called, when all of them are of one kind.
+constexpr std::string_view kAtHome = "At home";
+constexpr std::string_view kAtWork = "At work";
+constexpr std::string_view kVisitFarFromHome = "A visit away from home";
+
 /// What photos show, by inference word; words that say nothing about a picture are not here.
 constexpr auto kSubjects = std::to_array<Phrase>({
     {"wedding", "a wedding"},
@@ -161,6 +166,23 @@ bool holds(const KSEventBundle& bundle, KSEventCategory category) {
         bundle.events, [category](const auto& event) { return event->category() == category; });
 }
 
+/// Nothing where there is more than visits, or visits of several kinds.
+std::string_view visitHeadline(const KSEventBundle& bundle) {
+    constexpr std::uint64_t kHome = 1;
+    constexpr std::uint64_t kWork = 2;
+    const auto all = [&bundle](const auto& condition) {
+        return std::ranges::all_of(bundle.events, [&condition](const auto& event) {
+            return event->category() == KSEventCategory::visit && condition(*event);
+        });
+    };
+    if (all([](const KSEvent& event) { return event.placeUserType == kHome; })) return kAtHome;
+    if (all([](const KSEvent& event) { return event.placeUserType == kWork; })) return kAtWork;
+    if (all([](const KSEvent& event) { return event.mode == KSPlaceMode::tourist; })) {
+        return kVisitFarFromHome;
+    }
+    return {};
+}
+
 bool isMedia(const KSEventPointer& event) {
     return event->category() == KSEventCategory::mediaOnRepeat ||
            event->category() == KSEventCategory::leisureMedia;
@@ -189,6 +211,7 @@ std::string_view headline(const KSEventBundle& bundle) {
     const bool workout = holds(bundle, KSEventCategory::workout);
     const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
     const bool visit = holds(bundle, KSEventCategory::visit);
+    if (const auto words = visitHeadline(bundle); !words.empty()) return words;
     for (const auto& row : kClusterSentences) {
         if (row.workout == workout && row.photos == photos && (workout || row.visit == visit)) {
             return row.text;

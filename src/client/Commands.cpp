@@ -34,6 +34,28 @@ std::string shownEnd(KSDate start, KSDate end) {
     return sameDay ? calendar::format(end, "HH:mm") : shown(end);
 }
 
+/// Where a visit was, what the place is to the owner, and how far from home it is.
+std::string visitDetails(const KSEvent& event) {
+    std::string details;
+    if (event.placeName && !event.placeName->empty()) {
+        details = *event.placeName;
+    } else if (event.location) {
+        details =
+            fmt::format("{:.5f}, {:.5f}", event.location->latitude, event.location->longitude);
+    } else {
+        details = "somewhere";
+    }
+    const auto add = [&details](bool holds, std::string_view word) {
+        if (holds) details += fmt::format(", {}", word);
+    };
+    add(event.placeUserType == 1, "home");
+    add(event.placeUserType == 2, "work");
+    add(event.mode == KSPlaceMode::local && !event.isHomeWorkVisit(), "near home");
+    add(event.mode == KSPlaceMode::tourist, "away from home");
+    add(event.placeDiscovery == 1, "new place");
+    return details;
+}
+
 /// How often and for how long media were played: "3 times, 1 h 30 min".
 std::string playedText(double repetitions, double seconds) {
     std::string text;
@@ -55,7 +77,7 @@ std::string detailsOf(const KSEvent& event) {
         details += *part;
     };
     add(event.workoutType);
-    add(event.placeName);
+    add(event.category() == KSEventCategory::visit ? visitDetails(event) : event.placeName);
     add(event.suggestedEventTitle);
     add(event.tripTitle);
     add(event.mediaTitle);
@@ -73,10 +95,6 @@ std::string detailsOf(const KSEvent& event) {
             add(person.name);
         }
         return details;
-    }
-    if (details.empty() && event.location) {
-        details =
-            fmt::format("{:.5f}, {:.5f}", event.location->latitude, event.location->longitude);
     }
     if (details.empty()) add(event.identifierFromProvider);
     return details;

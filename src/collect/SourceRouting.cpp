@@ -5,6 +5,7 @@
 
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
+#include "sources/KSRoutineServiceManager.h"
 #include "sources/KSVitalsManager.h"
 
 namespace keepsakes {
@@ -20,6 +21,7 @@ bool hasNoSource(const KSEventArray& group) {
 
 EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
+      routineServiceManager_(universe.service<KSRoutineServiceManager>("RoutineServiceManager")),
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
       nowPlayingMediaManager_(
           universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")) {
@@ -29,6 +31,13 @@ EventSources::EventSources(const ServiceLookup& universe)
                               source->fetchAndSaveWorkoutsBetweenStartDate(start, end,
                                                                            std::move(done));
                           }});
+    }
+    if (routineServiceManager_) {
+        steps_.push_back(
+            {"resultVisitsSuccess",
+             [source = routineServiceManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveVisitsBetweenStartDate(start, end, std::move(done));
+             }});
     }
     if (photoManager_) {
         steps_.push_back(
@@ -53,6 +62,12 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
         return;
     }
     switch (group.front()->category()) {
+        case KSEventCategory::visit:
+            if (routineServiceManager_) {
+                routineServiceManager_->removeVisitsDeletedAtSource(group, std::move(handler));
+                return;
+            }
+            break;
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->removePhotoEventsDeletedAtSource(group, std::move(handler));
@@ -79,6 +94,12 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         return;
     }
     switch (group.front()->category()) {
+        case KSEventCategory::visit:
+            if (routineServiceManager_) {
+                routineServiceManager_->rehydrateVisits(group, std::move(handler));
+                return;
+            }
+            break;
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->rehydratePhotoKeepsakes(group, std::move(handler));

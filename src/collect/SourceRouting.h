@@ -14,6 +14,7 @@ namespace keepsakes {
 
 class KSNowPlayingMediaManager;
 class KSPhotoManager;
+class KSRoutineServiceManager;
 class KSVitalsManager;
 
 /// One source's part of a collection.
@@ -45,6 +46,7 @@ class EventSources {
 
   private:
     std::shared_ptr<KSVitalsManager> vitalsManager_;
+    std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
     std::shared_ptr<KSPhotoManager> photoManager_;
     std::shared_ptr<KSNowPlayingMediaManager> nowPlayingMediaManager_;
     std::vector<CollectionStep> steps_;

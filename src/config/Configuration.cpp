@@ -80,6 +80,17 @@ Setter folders(Configuration::Folders& target) {
     };
 }
 
+Setter file(std::filesystem::path& target) {
+    return [&target](const toml::node& value, const Surroundings& around) -> OptionalProblem {
+        const auto text = value.value_exact<std::string>();
+        if (!text) return problemAt(value, "must be a file's name");
+        auto path = expandFolder(*text, around.folderOfFile, around.environment);
+        if (!path) return problemAt(value, fmt::format("\"{}\" {}", *text, path.error()));
+        target = std::move(*path);
+        return std::nullopt;
+    };
+}
+
 Setter localDate(std::optional<Configuration::Day>& target) {
     return [&target](const toml::node& value, const Surroundings&) -> OptionalProblem {
         const auto date = value.value_exact<toml::date>();
@@ -119,6 +130,7 @@ std::vector<Key> keysOf(Configuration& to) {
         {"device_data", "messages", folders(to.deviceData.messages)},
         {"device_data", "contacts", folders(to.deviceData.contacts)},
         {"device_data", "places", folders(to.deviceData.places)},
+        {"device_data", "gazetteer", file(to.deviceData.gazetteer)},
         {"device_data", "media", boolean(to.deviceData.media)},
         {"owner", "date_of_birth", localDate(to.owner.dateOfBirth)},
         {"owner", "biological_sex", biologicalSex(to.owner.biologicalSex)},

@@ -31,6 +31,7 @@ struct Configuration {
         Folders messages;
         Folders contacts;
         Folders places;
+        std::filesystem::path gazetteer;  ///< A file; empty when there is none.
         bool media = true;
     } deviceData;
 

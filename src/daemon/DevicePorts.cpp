@@ -10,6 +10,7 @@
 #include "daemon/MemoryRelease.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
+#include "devicedata/IndexedRoutineService.h"
 #include "devicedata/MediaStreamFile.h"
 #include "linux/ActivityTimers.h"
 #include "linux/AnalyticsLog.h"
@@ -73,6 +74,8 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     options.index = std::move(index);
     options.tracks = configuration.deviceData.tracks;
     options.photos = configuration.deviceData.photos;
+    options.places = configuration.deviceData.places;
+    options.gazetteer = configuration.deviceData.gazetteer;
     return options;
 }
 
@@ -115,6 +118,7 @@ struct DevicePorts::Adapters {
           analytics(folders.analyticsFile(), *clock),
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
+          routine(folders.cache / kIndexFile, *clock),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
@@ -137,6 +141,7 @@ struct DevicePorts::Adapters {
     AnalyticsLog analytics;
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
+    IndexedRoutineService routine;
     IndexerProcess deviceData;
     ActivityTimers activities;
     MediaStreamFile media;
@@ -157,6 +162,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.analytics = &adapters_->analytics;
     services_.healthStore = &adapters_->health;
     services_.photoAnalysis = &adapters_->photos;
+    services_.routineService = &adapters_->routine;
     services_.nowPlayingStream = &adapters_->media;
     services_.deviceData = &adapters_->deviceData;
     services_.activities = &adapters_->activities;

@@ -23,6 +23,7 @@
 #include "service/KSManageServer.h"
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
+#include "sources/KSRoutineServiceManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
 #include "store/KSEventStore.h"
@@ -52,6 +53,7 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("EventBundleStore", KSEventBundleStore::initWithUniverse(*this));
     add("EventStore", KSEventStore::initWithUniverse(*this));
     add("PhotoManager", KSPhotoManager::initWithUniverse(*this));
+    add("RoutineServiceManager", KSRoutineServiceManager::initWithUniverse(*this));
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
     add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
     add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));

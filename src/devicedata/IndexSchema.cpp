@@ -51,6 +51,62 @@ CREATE TABLE occasions(
     photos INTEGER NOT NULL,
     content TEXT NOT NULL);
 CREATE INDEX occasionsByStart ON occasions(start);
+-- A file's points of one UTC day (counted from 2001-01-01), several rows where they are not in
+-- order; the days whose visits are to be found anew.
+CREATE TABLE points(file INTEGER NOT NULL, day INTEGER NOT NULL, data BLOB NOT NULL);
+CREATE INDEX pointsByDay ON points(day);
+CREATE INDEX pointsByFile ON points(file);
+CREATE TABLE staleDays(day INTEGER PRIMARY KEY);
+CREATE TABLE statedVisits(
+    file INTEGER NOT NULL,
+    firstDay INTEGER NOT NULL,
+    lastDay INTEGER NOT NULL,
+    start REAL NOT NULL,
+    end REAL NOT NULL,
+    latitude REAL NOT NULL,
+    longitude REAL NOT NULL,
+    name TEXT,
+    use INTEGER NOT NULL,
+    confidence REAL NOT NULL);
+CREATE INDEX statedVisitsByFile ON statedVisits(file);
+CREATE TABLE namedPlaces(
+    file INTEGER NOT NULL,
+    latitude REAL NOT NULL,
+    longitude REAL NOT NULL,
+    name TEXT NOT NULL,
+    use INTEGER NOT NULL,
+    origin INTEGER NOT NULL);
+CREATE INDEX namedPlacesByFile ON namedPlaces(file);
+-- What is found of all that: visits, stated ones with the name and use that the file gives, and the
+-- places that they are at, with the owner's name and that of a map.
+CREATE TABLE visits(
+    id INTEGER PRIMARY KEY,
+    start REAL NOT NULL,
+    end REAL NOT NULL,
+    latitude REAL NOT NULL,
+    longitude REAL NOT NULL,
+    confidence REAL NOT NULL,
+    isOpen INTEGER NOT NULL,
+    isStated INTEGER NOT NULL,
+    name TEXT,
+    use INTEGER NOT NULL,
+    recorded REAL NOT NULL,
+    place INTEGER);
+CREATE INDEX visitsByStart ON visits(start);
+CREATE INDEX visitsByEnd ON visits(end);
+CREATE TABLE places(
+    id INTEGER PRIMARY KEY,
+    identifier TEXT NOT NULL UNIQUE,
+    latitude REAL NOT NULL,
+    longitude REAL NOT NULL,
+    name TEXT,
+    mapName TEXT,
+    use INTEGER NOT NULL);
+CREATE TABLE gazetteer(
+    path BLOB NOT NULL, size INTEGER NOT NULL, mtime INTEGER NOT NULL, inode INTEGER NOT NULL,
+    reason TEXT);
+CREATE TABLE towns(latitude REAL NOT NULL, longitude REAL NOT NULL, name TEXT NOT NULL);
+CREATE INDEX townsByPosition ON towns(latitude, longitude, name);
 )sql";
 }
 

@@ -7,7 +7,7 @@ namespace keepsakes {
 
 /// The index's schema version (`user_version`). A file of another version is not migrated: the next
 /// scan deletes it and reads the owner's files anew.
-inline constexpr int kIndexVersion = 1;
+inline constexpr int kIndexVersion = 2;
 
 /// How long either side waits for the other's lock, in milliseconds.
 inline constexpr int kIndexBusyMilliseconds = 5000;
@@ -15,6 +15,7 @@ inline constexpr int kIndexBusyMilliseconds = 5000;
 /// Rows of the table "meta".
 inline constexpr std::string_view kMetaLastChanged = "lastChanged";  ///< Seconds since 2001.
 inline constexpr std::string_view kMetaOccasionsStale = "occasionsStale";
+inline constexpr std::string_view kMetaPlacesStale = "placesStale";
 inline constexpr std::string_view kMetaNextFile = "nextFile";
 
 /// What a file of the index is known as (column "state").

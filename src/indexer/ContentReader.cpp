@@ -11,8 +11,48 @@
 
 namespace keepsakes {
 
+namespace {
+
+/// Of a folder that is searched for places alone, only those count.
+class NamedPlacesOnly final : public LocationSink {
+  public:
+    explicit NamedPlacesOnly(LocationSink& places) : places_(places) {}
+    void point(const TrackPoint&) override {}
+    void visit(StatedVisit) override {}
+    void place(NamedPlace place) override { places_.place(std::move(place)); }
+
+  private:
+    LocationSink& places_;
+};
+
+std::expected<FileRecords, std::string> readTracks(int fd, FileKind kind,
+                                                   const ReaderContext& context,
+                                                   LocationSink& places) {
+    switch (kind) {
+        case FileKind::track:
+            return readTrackFile(fd, context, places);
+        case FileKind::fit:
+            return readFitFile(fd, context, places);
+        case FileKind::ownTracks:
+            return readOwnTracksFile(fd, context, places);
+        case FileKind::locationHistory:
+            return readLocationHistoryFile(fd, context, places);
+        case FileKind::geoJson:
+            return readGeoJsonFile(fd, context, places);
+        case FileKind::unknown:
+        case FileKind::photo:
+            break;
+    }
+    return FileRecords();
+}
+
+bool tellsOfPlaces(FileKind kind) { return kind != FileKind::unknown && kind != FileKind::photo; }
+
+}  // namespace
+
 std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int fd, int wanted,
-                                                                           KSDate now) {
+                                                                           KSDate now,
+                                                                           LocationSink& places) {
     std::array<std::byte, kHeadSize> head{};
     std::size_t filled = 0;
     while (filled < head.size()) {
@@ -25,8 +65,14 @@ std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int f
     }
     const auto kind = kindOf(std::span(head).first(filled));
     const ReaderContext context{.now = now};
-    if (kind == FileKind::track && (wanted & kWantsTracks) != 0) {
-        return readTrackFile(fd, context);
+    if (tellsOfPlaces(kind) && (wanted & kWantsTracks) != 0) {
+        return readTracks(fd, kind, context, places);
+    }
+    if (tellsOfPlaces(kind) && (wanted & kWantsPlaces) != 0) {
+        NamedPlacesOnly named(places);
+        const auto read = readTracks(fd, kind, context, named);
+        if (!read) return std::unexpected(read.error());
+        return FileRecords();
     }
     if (kind == FileKind::photo && (wanted & kWantsPhotos) != 0) {
         return readPhotoFile(fd, context);

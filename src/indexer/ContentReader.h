@@ -5,11 +5,11 @@
 
 namespace keepsakes {
 
-/// The reader of tracks and photos, by their content.
+/// The reader of everything that folders are searched for, by the files' content.
 class ContentReader final : public FileReader {
   public:
-    std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted,
-                                                                KSDate now) override;
+    std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted, KSDate now,
+                                                                LocationSink& places) override;
 };
 
 }  // namespace keepsakes

@@ -6,11 +6,12 @@
 #include <string>
 
 #include "readers/FileRecords.h"
+#include "readers/LocationRecords.h"
 
 namespace keepsakes {
 
 /// What a folder is searched for; the values are bits.
-enum Wanted : int { kWantsTracks = 1, kWantsPhotos = 2 };
+enum Wanted : int { kWantsTracks = 1, kWantsPhotos = 2, kWantsPlaces = 4 };
 
 /// Turns an open file into records. It may throw, crash, hang or eat memory: the scan is made for
 /// that.
@@ -19,9 +20,11 @@ class FileReader {
     virtual ~FileReader() = default;
 
     /// The records of a file whose content is of a kind in `wanted` (bits of `Wanted`), nothing
-    /// for one of another kind, or why the file cannot be read, as one line.
+    /// for one of another kind, or why the file cannot be read, as one line. What the file tells of
+    /// places goes to the sink meanwhile; of a file that cannot be read it is not to be believed.
     virtual std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted,
-                                                                        KSDate now) = 0;
+                                                                        KSDate now,
+                                                                        LocationSink& places) = 0;
 };
 
 }  // namespace keepsakes

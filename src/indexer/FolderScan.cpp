@@ -1,11 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "indexer/FolderScan.h"
 
-#include <fcntl.h>
 #include <fmt/format.h>
 #include <sqlite3.h>
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <array>
@@ -19,8 +16,13 @@
 #include "indexer/ContentHash.h"
 #include "indexer/FolderListing.h"
 #include "indexer/FolderWalk.h"
+#include "indexer/GazetteerUpdate.h"
 #include "indexer/IndexWriter.h"
+#include "indexer/LocationWriter.h"
 #include "indexer/OccasionUpdate.h"
+#include "indexer/OpenFile.h"
+#include "indexer/PlaceUpdate.h"
+#include "indexer/VisitUpdate.h"
 
 namespace keepsakes {
 
@@ -36,46 +38,18 @@ double secondsSince(Steady::time_point then) {
     return std::chrono::duration<double>(Steady::now() - then).count();
 }
 
-class OpenFile {
-  public:
-    explicit OpenFile(const std::string& path)
-        // Without O_NONBLOCK, a pipe that took the file's place would be waited for.
-        : fd_(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK)),
-          error_(fd_ < 0 ? errno : 0) {}
-    ~OpenFile() {
-        if (fd_ >= 0) ::close(fd_);
-    }
-    OpenFile(const OpenFile&) = delete;
-    OpenFile& operator=(const OpenFile&) = delete;
-
-    int get() const { return fd_; }
-    int error() const { return error_; }
-
-    std::optional<FileStamp> stamp() const {
-        struct stat info {};
-        if (fd_ < 0 || ::fstat(fd_, &info) != 0 || !S_ISREG(info.st_mode)) return std::nullopt;
-        return FileStamp{
-            .size = info.st_size,
-            .mtime = std::int64_t{info.st_mtim.tv_sec} * 1'000'000'000 + info.st_mtim.tv_nsec,
-            .inode = static_cast<std::int64_t>(info.st_ino)};
-    }
-
-  private:
-    int fd_;
-    int error_;
-};
-
 /// Whether the owner would take a file of this name for a track or a photo, so that its content's
 /// being neither is worth a word. What a file is, its content tells.
 bool promises(std::string_view name, int wanted) {
-    static constexpr std::array<std::string_view, 2> kTracks{".gpx", ".tcx"};
+    static constexpr std::array<std::string_view, 5> kTracks{".gpx", ".tcx", ".fit", ".rec",
+                                                             ".geojson"};
     static constexpr std::array<std::string_view, 5> kPhotos{".jpg", ".jpeg", ".png", ".heic",
                                                              ".heif"};
     const auto dot = name.rfind('.');
     if (dot == std::string_view::npos) return false;
     std::string extension(name.substr(dot));
     for (char& c : extension) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-    return ((wanted & kWantsTracks) != 0 &&
+    return ((wanted & (kWantsTracks | kWantsPlaces)) != 0 &&
             std::ranges::find(kTracks, extension) != kTracks.end()) ||
            ((wanted & kWantsPhotos) != 0 && std::ranges::find(kPhotos, extension) != kPhotos.end());
 }
@@ -101,17 +75,19 @@ class Scan {
           reader_(reader),
           mark_(mark),
           reporter_(reporter),
-          index_(options.index) {}
+          index_(options.index),
+          locations_(index_, [this] { tell(read_, changes_.changed.size()); }) {}
 
     void run() {
         changes_ = compareFolders(index_, searchedFolders(), [this] { tell(0, 0); });
         condemnMarked();
         moveRenamed();
         removeVanished();
+        takeGazetteer();
         commit();
-        formOccasions();
+        formRecords();
         readChanged();
-        formOccasions();
+        formRecords();
         if (summary_.changed) {
             index_.removeEmptyFolders();
             commit();
@@ -135,6 +111,7 @@ class Scan {
         };
         for (const auto& path : options_.tracks) add(path, kWantsTracks);
         for (const auto& path : options_.photos) add(path, kWantsPhotos);
+        for (const auto& path : options_.places) add(path, kWantsPlaces);
         return folders;
     }
 
@@ -162,6 +139,7 @@ class Scan {
                 left->outOfTime
                     ? Refusal{RefusalReason::outOfTime, "reading it took too long"}
                     : Refusal{RefusalReason::endedIndexer, "it ended the indexer that read it"};
+            if (found->knownId == 0) found->knownId = index_.newFileId();
             store(*found, outcome, FileState::condemned);
             changes_.changed.erase(found);
         }
@@ -219,20 +197,27 @@ class Scan {
         changes_.vanished = {};
     }
 
+    void takeGazetteer() {
+        if (auto problem = updateGazetteer(index_, options_.gazetteer, mark_)) {
+            changes_.problems.push_back(std::move(*problem));
+        }
+    }
+
     void readChanged() {
         auto& files = changes_.changed;
         std::ranges::stable_sort(files, std::ranges::greater{},
                                  [](const ChangedFile& file) { return file.stamp.mtime; });
-        for (std::size_t i = 0; i < files.size(); ++i) {
-            tell(i, files.size());
-            const auto outcome = read(files[i]);
+        for (auto& file : files) {
+            tell(read_, files.size());
+            if (file.knownId == 0) file.knownId = index_.newFileId();
+            const auto outcome = read(file);
             if (outcome.isGone) {
-                forget(files[i]);
+                forget(file);
             } else {
-                store(files[i], outcome, FileState::refused);
+                store(file, outcome, FileState::refused);
             }
-            ++summary_.read;
-            if (secondsSince(occasionsFormed_) > kSecondsPerOccasions) formOccasions();
+            read_ = ++summary_.read;
+            if (secondsSince(formed_) > kSecondsPerForming) formRecords();
         }
         if (!files.empty()) {
             told_ = {};
@@ -261,9 +246,10 @@ class Scan {
     }
 
     void readOpen(int fd, const ChangedFile& file, ReadOutcome& outcome) {
+        locations_.begin(file.knownId);
         try {
             outcome.hash = contentHash(fd, outcome.stamp.size).value_or("");
-            auto records = reader_.read(fd, file.wanted, options_.latest);
+            auto records = reader_.read(fd, file.wanted, options_.latest, locations_);
             if (!records) {
                 outcome.refusal = {RefusalReason::damaged, std::move(records.error())};
             } else if (*records) {
@@ -277,10 +263,12 @@ class Scan {
         } catch (const std::exception& error) {
             outcome.refusal = {RefusalReason::damaged, error.what()};
         }
+        // As `begin` outside: what goes wrong with the index is not the file's fault.
+        locations_.finish();
     }
 
     void store(const ChangedFile& file, const ReadOutcome& outcome, FileState refusedState) {
-        IndexedFile row{.id = file.knownId != 0 ? file.knownId : index_.newFileId(),
+        IndexedFile row{.id = file.knownId,
                         .stamp = outcome.stamp,
                         .wanted = file.wanted,
                         .state = outcome.records ? FileState::read : FileState::foreign,
@@ -297,7 +285,7 @@ class Scan {
         }
         if (outcome.records) {
             index_.putRecords(row.id, *outcome.records);
-        } else if (file.knownId != 0) {
+        } else {
             index_.removeRecords(row.id);
         }
         index_.putFile(index_.folderId(changes_.folders[file.folder]), file.name, row);
@@ -305,7 +293,6 @@ class Scan {
     }
 
     void forget(const ChangedFile& file) {
-        if (file.knownId == 0) return;
         index_.removeRecords(file.knownId);
         index_.removeFile(index_.folderId(changes_.folders[file.folder]), file.name);
         changed();
@@ -324,12 +311,17 @@ class Scan {
         committed_ = Steady::now();
     }
 
-    void formOccasions() {
-        occasionsFormed_ = Steady::now();
-        if (!index_.occasionsStale()) return;
-        updateOccasions(index_);
-        // A scan that died before this left it to be done.
-        summary_.changed = true;
+    void formRecords() {
+        formed_ = Steady::now();
+        // What is stale though nothing changed was left to be done by a scan that died.
+        if (index_.meta(kMetaOccasionsStale, 0) != 0) {
+            updateOccasions(index_);
+            summary_.changed = true;
+        }
+        if (updateVisits(index_, options_.now, [this] { tell(read_, changes_.changed.size()); })) {
+            summary_.changed = true;
+        }
+        if (updatePlaces(index_)) summary_.changed = true;
         commit();
     }
 
@@ -352,11 +344,13 @@ class Scan {
     ReadMark& mark_;
     ScanReporter& reporter_;
     IndexWriter index_;
+    LocationWriter locations_;
     FolderChanges changes_;
     ScanSummary summary_;
+    std::uint64_t read_ = 0;
     std::size_t uncommitted_ = 0;
     Steady::time_point committed_ = Steady::now();
-    Steady::time_point occasionsFormed_ = Steady::now();
+    Steady::time_point formed_ = Steady::now();
     Steady::time_point told_;
 };
 

@@ -21,8 +21,8 @@ inline constexpr std::size_t kDeepestFolder = 128;
 /// Pending changes are committed after so many files or seconds: a crash costs no more.
 inline constexpr std::size_t kFilesPerCommit = 128;
 inline constexpr double kSecondsPerCommit = 1;
-/// While a long scan runs, occasions are formed so often that the owner sees the newest ones.
-inline constexpr double kSecondsPerOccasions = 30;
+/// While a long scan runs, occasions and visits are formed so often that the owner sees the newest.
+inline constexpr double kSecondsPerForming = 30;
 /// Problem lines of one scan.
 inline constexpr std::size_t kMostProblems = 50;
 
@@ -30,6 +30,8 @@ struct ScanOptions {
     std::filesystem::path index;
     std::vector<std::filesystem::path> tracks;  ///< Folders searched for tracks.
     std::vector<std::filesystem::path> photos;  ///< Folders searched for photos.
+    std::vector<std::filesystem::path> places;  ///< Folders searched for named places.
+    std::filesystem::path gazetteer;            ///< A file of towns, or empty.
     KSDate now;
     /// What files may claim as their time, at most: for a daemon that replays older recordings, the
     /// system's time, so that its files are not taken for ones of the future.
@@ -38,7 +40,8 @@ struct ScanOptions {
 
 /// Brings the index up to date with the owner's folders: stats every file, reads those that are
 /// new or changed (newest first), drops the records of those that are gone, carries the records of
-/// a moved file to its new path, and forms the occasions anew where photos changed.
+/// a moved file to its new path, and forms occasions, visits and places anew where what they are
+/// made of changed.
 ///
 /// A folder that is configured and cannot be listed keeps its records: a disk that is not mounted
 /// is no deletion. Symbolic links inside the folders are not followed. The file on `mark` is passed

@@ -123,7 +123,9 @@ IndexWriter::Totals IndexWriter::totals() {
             .workouts = count("SELECT count(*) FROM (SELECT DISTINCT start, end, type"
                               " FROM workouts)"),
             .photos = count("SELECT count(*) FROM photos"),
-            .occasions = count("SELECT count(*) FROM occasions")};
+            .occasions = count("SELECT count(*) FROM occasions"),
+            .visits = count("SELECT count(*) FROM visits"),
+            .places = count("SELECT count(*) FROM places")};
 }
 
 std::vector<RefusedFile> IndexWriter::refusedFiles(std::size_t most) {
@@ -208,7 +210,7 @@ void IndexWriter::putRecords(std::int64_t file, const FileRecords& records) {
         occasions.emplace(before.getColumn(0).getInt64(), before.getColumn(1).getInt64());
     }
     before.reset();
-    removeRecords(file);
+    removeOtherRecords(file);
     for (const auto& workout : records.workouts) {
         if (!isSane(workout.start) || !isSane(workout.end)) continue;
         auto& put = statement("INSERT INTO workouts(file, start, end, type) VALUES(?, ?, ?, ?)");
@@ -255,6 +257,11 @@ void IndexWriter::putRecords(std::int64_t file, const FileRecords& records) {
 }
 
 void IndexWriter::removeRecords(std::int64_t file) {
+    removeLocations(file);
+    removeOtherRecords(file);
+}
+
+void IndexWriter::removeOtherRecords(std::int64_t file) {
     begin();
     for (const char* text :
          {"DELETE FROM workouts WHERE file = ?", "DELETE FROM zones WHERE file = ?",
@@ -268,7 +275,77 @@ void IndexWriter::removeRecords(std::int64_t file) {
     }
 }
 
-bool IndexWriter::occasionsStale() { return meta(kMetaOccasionsStale, 0) != 0; }
+void IndexWriter::removeLocations(std::int64_t file) {
+    begin();
+    for (const char* text :
+         {"INSERT OR IGNORE INTO staleDays SELECT day FROM points WHERE file = ?",
+          "DELETE FROM points WHERE file = ?",
+          "INSERT OR IGNORE INTO staleDays"
+          " WITH RECURSIVE days(day, lastDay) AS (SELECT firstDay, lastDay FROM statedVisits"
+          " WHERE file = ? UNION SELECT day + 1, lastDay FROM days WHERE day < lastDay)"
+          " SELECT day FROM days",
+          "DELETE FROM statedVisits WHERE file = ?"}) {
+        auto& remove = statement(text);
+        remove.bind(1, file);
+        remove.exec();
+    }
+    auto& remove = statement("DELETE FROM namedPlaces WHERE file = ?");
+    remove.bind(1, file);
+    if (remove.exec() > 0) setMeta(kMetaPlacesStale, 1);
+}
+
+void IndexWriter::putPoints(std::int64_t file, std::int64_t day, const std::string& bytes) {
+    begin();
+    auto& put = statement("INSERT INTO points(file, day, data) VALUES(?, ?, ?)");
+    put.bind(1, file);
+    put.bind(2, day);
+    bindBytes(put, 3, bytes);
+    put.exec();
+    auto& mark = statement("INSERT OR IGNORE INTO staleDays VALUES(?)");
+    mark.bind(1, day);
+    mark.exec();
+}
+
+void IndexWriter::putStatedVisit(std::int64_t file, const StatedVisit& visit, std::int64_t firstDay,
+                                 std::int64_t lastDay) {
+    begin();
+    auto& put = statement(
+        "INSERT INTO statedVisits(file, firstDay, lastDay, start, end, latitude, longitude, name,"
+        " use, confidence) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
+    put.clearBindings();
+    put.bind(1, file);
+    put.bind(2, firstDay);
+    put.bind(3, lastDay);
+    put.bind(4, visit.stay.start.seconds);
+    put.bind(5, visit.stay.end.seconds);
+    put.bind(6, visit.position.latitude);
+    put.bind(7, visit.position.longitude);
+    if (!visit.name.empty()) put.bind(8, printable(visit.name));
+    put.bind(9, static_cast<int>(visit.use));
+    put.bind(10, visit.confidence);
+    put.exec();
+    auto& mark = statement("INSERT OR IGNORE INTO staleDays VALUES(?)");
+    for (auto day = firstDay; day <= lastDay; ++day) {
+        mark.reset();
+        mark.bind(1, day);
+        mark.exec();
+    }
+}
+
+void IndexWriter::putNamedPlace(std::int64_t file, const NamedPlace& place) {
+    begin();
+    auto& put = statement(
+        "INSERT INTO namedPlaces(file, latitude, longitude, name, use, origin)"
+        " VALUES(?, ?, ?, ?, ?, ?)");
+    put.bind(1, file);
+    put.bind(2, place.position.latitude);
+    put.bind(3, place.position.longitude);
+    put.bind(4, printable(place.name));
+    put.bind(5, static_cast<int>(place.use));
+    put.bind(6, static_cast<int>(place.origin));
+    put.exec();
+    setMeta(kMetaPlacesStale, 1);
+}
 
 double IndexWriter::meta(std::string_view key, double otherwise) {
     auto& query = statement("SELECT value FROM meta WHERE key = ?");

@@ -15,6 +15,7 @@
 #include "devicedata/IndexSchema.h"
 #include "indexer/ReadMark.h"
 #include "readers/FileRecords.h"
+#include "readers/LocationRecords.h"
 
 namespace keepsakes {
 
@@ -59,6 +60,8 @@ class IndexWriter {
         std::uint64_t workouts = 0;
         std::uint64_t photos = 0;
         std::uint64_t occasions = 0;
+        std::uint64_t visits = 0;
+        std::uint64_t places = 0;  ///< Locations of interest.
     };
     Totals totals();
 
@@ -76,11 +79,22 @@ class IndexWriter {
     void removeEmptyFolders();
 
     /// Replaces the records of a file. Photos stay in their occasions by their number in the file,
-    /// until occasions are formed anew. Records with numbers that are no times are left out.
+    /// until occasions are formed anew. Records with numbers that are no times are left out. What
+    /// the file tells of places stays.
     void putRecords(std::int64_t file, const FileRecords& records);
+    /// All that the file told, also of places.
     void removeRecords(std::int64_t file);
 
-    bool occasionsStale();
+    // What a file tells of places, and the days whose visits are to be found anew.
+
+    void removeLocations(std::int64_t file);
+    /// A day's points, as `encodePoints` makes them.
+    void putPoints(std::int64_t file, std::int64_t day, const std::string& bytes);
+    void putStatedVisit(std::int64_t file, const StatedVisit& visit, std::int64_t firstDay,
+                        std::int64_t lastDay);
+    void putNamedPlace(std::int64_t file, const NamedPlace& place);
+
+    double meta(std::string_view key, double otherwise);
     void setMeta(std::string_view key, double value);
 
     /// Makes what was changed last, as of a scan at `now`.
@@ -93,7 +107,7 @@ class IndexWriter {
 
   private:
     void begin();
-    double meta(std::string_view key, double otherwise);
+    void removeOtherRecords(std::int64_t file);
 
     SQLite::Database database_;
     std::unordered_map<std::string, SQLite::Statement> statements_;

@@ -30,11 +30,12 @@ constexpr int kBusy = 3;
 
 constexpr const char* kHelp =
     "usage: keepsakes-indexer [--config FILE] [--index FILE] [--tracks FOLDER...]\n"
-    "                         [--photos FOLDER...] [--now SECONDS] [--seconds-per-file N]\n"
-    "                         [--json | --human]\n"
+    "                         [--photos FOLDER...] [--places FOLDER...] [--gazetteer FILE]\n"
+    "                         [--now SECONDS] [--seconds-per-file N] [--json | --human]\n"
     "Scans the folders once and brings the index up to date.\n"
     "  --config   whose folders to scan when none are given; otherwise the daemon's\n"
     "  --index    the index; otherwise the daemon's, in the user's cache folder\n"
+    "  --gazetteer  a table of towns in the format of GeoNames, to call places by\n"
     "  --now      the time to take for now, in seconds since 2001-01-01 UTC\n"
     "  --json     one JSON object a line on standard output\n"
     "  --human    sentences for people; the default on a terminal\n";
@@ -56,7 +57,7 @@ KSDate systemNow() {
 /// user's cache folder. Why that cannot be done, or nothing.
 std::optional<std::string> complete(Arguments& arguments) {
     auto& scan = arguments.scan;
-    const bool needsFolders = scan.tracks.empty() && scan.photos.empty();
+    const bool needsFolders = scan.tracks.empty() && scan.photos.empty() && scan.places.empty();
     if (!needsFolders && !scan.index.empty()) return std::nullopt;
     const auto standard = StandardFolders::find();
     if (!standard) return standard.error().description();
@@ -68,6 +69,8 @@ std::optional<std::string> complete(Arguments& arguments) {
     if (!configuration) return configuration.error().description();
     scan.tracks = configuration->deviceData.tracks;
     scan.photos = configuration->deviceData.photos;
+    scan.places = configuration->deviceData.places;
+    if (scan.gazetteer.empty()) scan.gazetteer = configuration->deviceData.gazetteer;
     return std::nullopt;
 }
 
@@ -86,13 +89,19 @@ std::optional<std::string> parse(std::span<char*> words, Arguments& arguments) {
     };
     while (i < words.size()) {
         const std::string_view option(words[i++]);
-        if (option == "--tracks" || option == "--photos") {
-            auto& folders = option == "--tracks" ? arguments.scan.tracks : arguments.scan.photos;
+        if (option == "--tracks" || option == "--photos" || option == "--places") {
+            auto& folders = option == "--tracks"   ? arguments.scan.tracks
+                            : option == "--photos" ? arguments.scan.photos
+                                                   : arguments.scan.places;
             while (i < words.size() && !isOption(words[i])) folders.emplace_back(words[i++]);
         } else if (option == "--index") {
             const auto path = value();
             if (!path) return "--index needs a file";
             arguments.scan.index = *path;
+        } else if (option == "--gazetteer") {
+            const auto path = value();
+            if (!path) return "--gazetteer needs a file";
+            arguments.scan.gazetteer = *path;
         } else if (option == "--config") {
             const auto path = value();
             if (!path) return "--config needs a file";
@@ -136,6 +145,13 @@ int scan(const Arguments& arguments, FileReader& reader) {
     calendar::offsetAt(options.now);
     auto readable = options.tracks;
     readable.insert(readable.end(), options.photos.begin(), options.photos.end());
+    readable.insert(readable.end(), options.places.begin(), options.places.end());
+    if (!options.gazetteer.empty()) {
+        // The configured file may be a link; what it leads to is read.
+        std::error_code ignored;
+        options.gazetteer = std::filesystem::weakly_canonical(options.gazetteer, ignored);
+        readable.push_back(options.gazetteer);
+    }
     confineProcess(readable, {folder});
     // People read of each problem in the report.
     if (!arguments.json) setLogLevel(LogLevel::error);

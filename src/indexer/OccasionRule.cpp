@@ -4,10 +4,8 @@
 #include <nettle/sha2.h>
 
 #include <algorithm>
-#include <cmath>
 #include <limits>
 #include <map>
-#include <numbers>
 #include <numeric>
 #include <tuple>
 
@@ -17,19 +15,8 @@ namespace keepsakes {
 
 namespace {
 
-constexpr double kEarthRadius = 6371008.8;
 /// How many spans before a time are looked at; only heaps of overlapping tracks need more.
 constexpr std::size_t kMostSpansLookedAt = 256;
-
-/// Metres along the great circle (the haversine formula).
-double distance(const GeoPoint& a, const GeoPoint& b) {
-    constexpr double kRadians = std::numbers::pi / 180;
-    const double lat = std::sin((b.latitude - a.latitude) * kRadians / 2);
-    const double lon = std::sin((b.longitude - a.longitude) * kRadians / 2);
-    const double h =
-        lat * lat + std::cos(a.latitude * kRadians) * std::cos(b.latitude * kRadians) * lon * lon;
-    return 2 * kEarthRadius * std::asin(std::min(1.0, std::sqrt(h)));
-}
 
 /// An occasion that further photos may join.
 struct Open {
@@ -49,8 +36,9 @@ std::vector<Open>::iterator joined(std::vector<Open>& open, const OccasionPhoto&
     double nearest = std::numeric_limits<double>::infinity();
     for (auto it = open.begin(); it != open.end(); ++it) {
         // No position on one side: time alone decides, but a known near place goes before it.
-        const double metres =
-            photo.position && it->place ? distance(*photo.position, *it->place) : kLongestDistance;
+        const double metres = photo.position && it->place
+                                  ? distanceBetween(*photo.position, *it->place)
+                                  : kLongestDistance;
         if (metres <= kLongestDistance && metres <= nearest) {
             nearest = metres;
             best = it;

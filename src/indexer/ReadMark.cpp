@@ -6,6 +6,7 @@
 #include <sys/file.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <csignal>
@@ -106,7 +107,9 @@ void ReadMark::begin(const std::string& path, const FileStamp& stamp) {
         fmt::format("c\n{}\n{}\n{}\n{}\n{}", bootId_, stamp.size, stamp.mtime, stamp.inode, path);
     (void)!::pwrite(fd_, text.data(), text.size(), 0);
     (void)!::ftruncate(fd_, static_cast<off_t>(text.size()));
-    ::alarm(secondsPerFile_);
+    constexpr std::int64_t kMostSeconds = 3600;
+    ::alarm(secondsPerFile_ +
+            static_cast<unsigned>(std::min(stamp.size / kBytesPerSecond, kMostSeconds)));
 }
 
 // NOLINTNEXTLINE(readability-make-member-function-const): it changes the file

@@ -34,6 +34,8 @@ class ReadMark {
   public:
     static constexpr int kStoppedStatus = 4;
     static constexpr unsigned kSecondsPerFile = 30;
+    /// A second more for each of so many bytes.
+    static constexpr std::int64_t kBytesPerSecond = 10'000'000;
 
     /// Fails when another scan holds the lock, or when the file cannot be written.
     static std::expected<std::unique_ptr<ReadMark>, std::string> take(

@@ -26,6 +26,8 @@ class JsonReporter final : public ScanReporter {
                                        {"workouts", summary.totals.workouts},
                                        {"photos", summary.totals.photos},
                                        {"occasions", summary.totals.occasions},
+                                       {"visits", summary.totals.visits},
+                                       {"places", summary.totals.places},
                                        {"read", summary.read},
                                        {"renamed", summary.renamed},
                                        {"removed", summary.removed},
@@ -57,8 +59,11 @@ class HumanReporter final : public ScanReporter {
     void report(const ScanSummary& summary) override {
         endProgress();
         const auto& totals = summary.totals;
-        fmt::print("{} files known: {} workouts; {} photos in {} occasions; {} files refused.\n",
-                   totals.files, totals.workouts, totals.photos, totals.occasions, totals.refused);
+        fmt::print(
+            "{} files known: {} workouts; {} visits to {} places; {} photos in {} "
+            "occasions; {} files refused.\n",
+            totals.files, totals.workouts, totals.visits, totals.places, totals.photos,
+            totals.occasions, totals.refused);
         fmt::print("This scan read {} new or changed files, found {} moved and {} gone.\n",
                    summary.read, summary.renamed, summary.removed);
     }

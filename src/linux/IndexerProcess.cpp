@@ -243,6 +243,8 @@ std::vector<std::string> IndexerProcess::arguments() const {
     };
     add("--tracks", options_.tracks);
     add("--photos", options_.photos);
+    add("--places", options_.places);
+    if (!options_.gazetteer.empty()) add("--gazetteer", {options_.gazetteer});
     return words;
 }
 

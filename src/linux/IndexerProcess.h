@@ -20,6 +20,8 @@ struct IndexerOptions {
     std::filesystem::path index;
     std::vector<std::filesystem::path> tracks;
     std::vector<std::filesystem::path> photos;
+    std::vector<std::filesystem::path> places;
+    std::filesystem::path gazetteer;  ///< Empty when there is none.
     /// Seconds after which `refresh` returns though the scan goes on; the next one joins it.
     double replyLimit = 100;
     /// Seconds after which a scan is ended in order.

@@ -18,6 +18,7 @@ class NowPlayingStream;
 class PhotoAnalysis;
 class PowerSources;
 class Problems;
+class RoutineService;
 class SystemNotifications;
 class UserDefaults;
 
@@ -42,6 +43,7 @@ struct PlatformServices {
     AnalyticsService* analytics = nullptr;
     HealthStore* healthStore = nullptr;
     PhotoAnalysis* photoAnalysis = nullptr;
+    RoutineService* routineService = nullptr;
     NowPlayingStream* nowPlayingStream = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BackgroundActivities* activities = nullptr;

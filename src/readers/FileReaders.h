@@ -32,15 +32,17 @@ struct ReaderContext {
     KSDate now;  ///< A day after it, times are no longer believed.
 };
 
-/// The recorded tracks of a GPX file, or the activities of a TCX file, as workouts; and the spans
-/// for which their timestamps tell the zone. A valid file without any is empty records.
-std::expected<FileRecords, std::string> readTrackFile(int fd, const ReaderContext& context);
-
 /// The one photo that a JPEG, PNG or HEIF file is, by its metadata.
 std::expected<FileRecords, std::string> readPhotoFile(int fd, const ReaderContext& context);
 
 // The following hand what the file says of places to the sink while they read. When they answer an
 // error, the sink has got a part of a file that is not to be believed.
+
+/// The recorded tracks of a GPX file, or the activities of a TCX file, as workouts; and the spans
+/// for which their timestamps tell the zone. A valid file without any is empty records. Points with
+/// a time, and a GPX file's waypoints with a name of the owner's, go to the sink.
+std::expected<FileRecords, std::string> readTrackFile(int fd, const ReaderContext& context,
+                                                      LocationSink& places);
 
 /// The points and sessions (as workouts) of a FIT recording, and the zone that it states. What
 /// stands in one that ends early counts up to there.

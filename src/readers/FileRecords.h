@@ -6,16 +6,10 @@
 #include <vector>
 
 #include "core/KSDate.h"
+#include "platform/GeoPoint.h"
 #include "platform/HealthStore.h"
 
 namespace keepsakes {
-
-struct GeoPoint {
-    double latitude = 0;   ///< Degrees north.
-    double longitude = 0;  ///< Degrees east.
-
-    friend bool operator==(const GeoPoint&, const GeoPoint&) = default;
-};
 
 /// Where the offset of a local time came from, best first.
 enum class TimeSource { offset, gps, track, ownerZone };

@@ -48,6 +48,10 @@ inline constexpr std::size_t kMostZoneSpans = 10000;
 /// A track that spans more seconds than 31 days holds a wrong timestamp or is no workout.
 inline constexpr double kLongestWorkout = 31 * 86400.0;
 
+// Gazetteers.
+
+inline constexpr std::size_t kMostTowns = 1'000'000;
+
 // Location histories.
 
 /// Points of a path whose times stand apart from them, and which wait for those.

@@ -14,6 +14,8 @@
 
 #include "readers/Position.h"
 #include "readers/ReaderLimits.h"
+#include "readers/StatedPlaces.h"
+#include "readers/TextFolding.h"
 #include "readers/TrackSummary.h"
 
 namespace keepsakes {
@@ -29,6 +31,9 @@ enum class Place : std::uint8_t {
     gpxType,
     gpxSegment,
     gpxPoint,
+    waypoint,
+    waypointWord,
+    waypointName,
     tcx,
     activities,
     multiSport,
@@ -51,14 +56,18 @@ struct Step {
     Place child;
 };
 
-// GPX 1.0 and 1.1: routes and waypoints are no recordings. TCX v2: courses and workout plans are
-// none either.
+// GPX 1.0 and 1.1: routes are no recordings; waypoints are places that the owner named. TCX v2:
+// courses and workout plans are none either.
 constexpr auto kSteps = std::to_array<Step>({
     {Place::gpxPoint, "time", Place::pointTime},
     {Place::gpxSegment, "trkpt", Place::gpxPoint},
     {Place::gpxTrack, "trkseg", Place::gpxSegment},
     {Place::gpxTrack, "type", Place::gpxType},
     {Place::gpx, "trk", Place::gpxTrack},
+    {Place::gpx, "wpt", Place::waypoint},
+    {Place::waypoint, "name", Place::waypointName},
+    {Place::waypoint, "type", Place::waypointWord},
+    {Place::waypoint, "sym", Place::waypointWord},
     {Place::document, "gpx", Place::gpx},
     {Place::tcxPoint, "Time", Place::pointTime},
     {Place::tcxPoint, "Position", Place::tcxPosition},
@@ -87,6 +96,8 @@ Place placeOf(Place parent, std::string_view name) {
 bool holdsValue(Place place) {
     switch (place) {
         case Place::gpxType:
+        case Place::waypointName:
+        case Place::waypointWord:
         case Place::lapSeconds:
         case Place::tcxDistance:
         case Place::latitude:
@@ -116,29 +127,40 @@ std::optional<double> number(std::optional<std::string_view> text) {
     return value;
 }
 
+/// Names that devices give by themselves ("LAP001", "WPT 12", "7") are no names of the owner's; nor
+/// is none.
+bool isNumberedByDevice(std::string_view name) {
+    constexpr auto kWords = std::to_array<std::string_view>(
+        {"", "lap", "wpt", "waypoint", "point", "poi", "marker", "photo"});
+    auto folded = foldWord(name);
+    while (!folded.empty() && folded.back() >= '0' && folded.back() <= '9') folded.pop_back();
+    return std::ranges::find(kWords, folded) != kWords.end();
+}
+
 class TrackFile final : public XmlHandler {
   public:
-    explicit TrackFile(const ReaderContext& context) : now_(context.now) {}
+    TrackFile(const ReaderContext& context, LocationSink& places)
+        : now_(context.now), places_(places) {}
 
     void startElement(std::string_view name, XmlAttributes attributes) override {
-        const auto parent = places_.empty() ? Place::document : places_.back();
+        const auto parent = path_.empty() ? Place::document : path_.back();
         const auto place = placeOf(parent, name);
-        if (places_.empty() && place == Place::ignored) {
+        if (path_.empty() && place == Place::ignored) {
             otherRoot_ = std::string(name.substr(0, limits::kLongestValue));
         }
-        places_.push_back(place);
+        path_.push_back(place);
         if (place == Place::ignored) return;
         value_.clear();
         enter(place, attributes);
     }
 
     void endElement() override {
-        leave(places_.back());
-        places_.pop_back();
+        leave(path_.back());
+        path_.pop_back();
     }
 
     void text(std::string_view piece) override {
-        if (places_.empty() || !holdsValue(places_.back())) return;
+        if (path_.empty() || !holdsValue(path_.back())) return;
         // One byte beyond the limit is kept: it tells that the text is no value.
         value_ += piece.substr(0, limits::kLongestValue + 1 - value_.size());
     }
@@ -182,6 +204,11 @@ class TrackFile final : public XmlHandler {
             case Place::tcxPoint:
                 startPoint();
                 break;
+            case Place::waypoint:
+                waypoint_ = {};
+                waypointPosition_ =
+                    geoPoint(number(attributes.find("lat")), number(attributes.find("lon")));
+                break;
             case Place::tcxPosition:
                 latitude_.reset();
                 longitude_.reset();
@@ -220,6 +247,19 @@ class TrackFile final : public XmlHandler {
             case Place::tcxPoint:
                 endPoint();
                 break;
+            case Place::waypointName:
+                waypoint_.name = cleanText(value().value_or(""));
+                break;
+            case Place::waypointWord:
+                // How receivers call the symbol of a house.
+                if (value() == "Residence") waypoint_.use = PlaceUse::home;
+                if (waypoint_.use == PlaceUse::unknown) {
+                    waypoint_.use = useOfName(value().value_or(""));
+                }
+                break;
+            case Place::waypoint:
+                endWaypoint();
+                break;
             case Place::lapSeconds:
                 lapSeconds_ = number(value());
                 break;
@@ -245,6 +285,13 @@ class TrackFile final : public XmlHandler {
         point_.time = pointTime_->date;
         point_.offsetSeconds = pointTime_->offsetSeconds;
         track_->addPoint(point_);
+        if (point_.position) places_.point({.time = point_.time, .position = *point_.position});
+    }
+
+    void endWaypoint() {
+        if (!waypointPosition_ || isNumberedByDevice(waypoint_.name)) return;
+        waypoint_.position = *waypointPosition_;
+        places_.place(std::move(waypoint_));
     }
 
     void endLap() {
@@ -286,8 +333,9 @@ class TrackFile final : public XmlHandler {
     }
 
     KSDate now_;
+    LocationSink& places_;
     FileRecords records_;
-    std::vector<Place> places_;  // as deep as the parser allows
+    std::vector<Place> path_;  // as deep as the parser allows
     std::string otherRoot_;
     std::string value_;
     bool tooMany_ = false;
@@ -298,6 +346,8 @@ class TrackFile final : public XmlHandler {
     std::optional<TrackSummary> track_;
     TrackSample point_;
     std::optional<ParsedDate> pointTime_;
+    NamedPlace waypoint_;
+    std::optional<GeoPoint> waypointPosition_;
     std::optional<double> latitude_;
     std::optional<double> longitude_;
     std::optional<ParsedDate> lapStart_;
@@ -307,14 +357,16 @@ class TrackFile final : public XmlHandler {
 }  // namespace
 
 std::expected<FileRecords, std::string> readTrack(const ReadBlock& read,
-                                                  const ReaderContext& context) {
-    TrackFile file(context);
+                                                  const ReaderContext& context,
+                                                  LocationSink& places) {
+    TrackFile file(context, places);
     if (auto done = readXml(read, file); !done) return std::unexpected(std::move(done.error()));
     return file.finish();
 }
 
-std::expected<FileRecords, std::string> readTrackFile(int fd, const ReaderContext& context) {
-    return readTrack(readDescriptor(fd), context);
+std::expected<FileRecords, std::string> readTrackFile(int fd, const ReaderContext& context,
+                                                      LocationSink& places) {
+    return readTrack(readDescriptor(fd), context, places);
 }
 
 }  // namespace keepsakes

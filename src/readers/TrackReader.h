@@ -11,6 +11,7 @@ namespace keepsakes {
 
 /// `readTrackFile` for bytes from anywhere.
 std::expected<FileRecords, std::string> readTrack(const ReadBlock& read,
-                                                  const ReaderContext& context);
+                                                  const ReaderContext& context,
+                                                  LocationSink& places);
 
 }  // namespace keepsakes

@@ -3,7 +3,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <numbers>
 
 #include "platform/ActivityCatalogue.h"
 #include "readers/ReaderLimits.h"
@@ -24,18 +23,6 @@ constexpr double kFastestWalk = 2.0;     // 7.2 km/h
 constexpr double kFastestRun = 4.2;      // 15 km/h
 constexpr double kFastestRide = 12.5;    // 45 km/h
 constexpr double kFastestSprint = 16.0;  // 58 km/h, for a tenth of the moving time
-
-/// Great-circle distance in metres on a sphere of the mean earth radius (haversine formula).
-double distanceBetween(const GeoPoint& a, const GeoPoint& b) {
-    constexpr double kEarthRadius = 6371008.8;
-    constexpr double kRadians = std::numbers::pi / 180;
-    const double sinLatitude = std::sin((b.latitude - a.latitude) * kRadians / 2);
-    const double sinLongitude = std::sin((b.longitude - a.longitude) * kRadians / 2);
-    const double h = sinLatitude * sinLatitude + std::cos(a.latitude * kRadians) *
-                                                     std::cos(b.latitude * kRadians) *
-                                                     sinLongitude * sinLongitude;
-    return 2 * kEarthRadius * std::asin(std::min(1.0, std::sqrt(h)));
-}
 
 std::optional<double> legLength(const TrackSample& from, const TrackSample& to) {
     if (from.position && to.position) return distanceBetween(*from.position, *to.position);

@@ -52,6 +52,13 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
               "Time with the baby: Saturday 10:02, 2 photos of a baby");
     EXPECT_EQ(prompt("", {makeVisit(1, start.seconds, start.seconds, "Museum")}),
               "A visit: Museum, Saturday 10:02");
+    const auto home = makeVisit(1, start.seconds, start.seconds, "Elm Street");
+    home->placeUserType = 1;
+    EXPECT_EQ(prompt("", {home}), "At home: Elm Street, Saturday 10:02");
+    const auto far = makeVisit(2, start.seconds, start.seconds, "Lake");
+    far->mode = KSPlaceMode::tourist;
+    EXPECT_EQ(prompt("", {far}), "A visit away from home: Lake, Saturday 10:02");
+    EXPECT_EQ(prompt("", {home, far}), "A visit: Elm Street, Lake, Saturday 10:02");
     EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
                                     KSEventCategory::topic)}),
               "A moment: Saturday 10:02 to 12:31");

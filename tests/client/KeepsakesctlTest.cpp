@@ -132,6 +132,28 @@ TEST_F(KeepsakesctlTest, OptionsReachTheDaemon) {
     EXPECT_TRUE(conduit_.lastBundleOptions().ascending);
 }
 
+TEST_F(KeepsakesctlTest, VisitsTellWhatThePlaceIsToTheOwner) {
+    const auto shown = [this](const std::function<void(KSEvent&)>& change) {
+        const auto visit = samples::event(1);
+        change(*visit);
+        conduit_.setEvents({visit});
+        return run("events").output;
+    };
+    EXPECT_THAT(shown([](KSEvent& visit) {
+                    visit.mode = KSPlaceMode::tourist;
+                    visit.placeDiscovery = 1;
+                }),
+                HasSubstr("Caf\u00e9 \u6771\u4eac, away from home, new place\n"));
+    EXPECT_THAT(shown([](KSEvent& visit) {
+                    visit.placeName.reset();
+                    visit.location = KSLocation{47.5, -13.6};
+                    visit.mode = KSPlaceMode::local;
+                    visit.placeUserType = 2;
+                    visit.placeDiscovery = 2;
+                }),
+                HasSubstr("47.50000, -13.60000, work\n"));
+}
+
 TEST_F(KeepsakesctlTest, TheJsonFormIsStableAndGoesBackIn) {
     conduit_.setEvents({samples::fullEvent(1), samples::event(2)});
     const auto json = run("events --json");

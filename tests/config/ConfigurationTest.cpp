@@ -38,6 +38,7 @@ calendars = ["~"]
 messages = []
 contacts = ["/"]
 places = ["/srv/../etc/places"]
+gazetteer = "~/towns.txt"
 media = false
 [owner]
 date_of_birth = 1990-05-01
@@ -64,6 +65,7 @@ scan = true
     EXPECT_THAT(read->deviceData.messages, ElementsAre());
     EXPECT_THAT(read->deviceData.contacts, ElementsAre("/"));
     EXPECT_THAT(read->deviceData.places, ElementsAre("/etc/places"));
+    EXPECT_EQ(read->deviceData.gazetteer, "/home/ada/towns.txt");
     EXPECT_FALSE(read->deviceData.media);
     EXPECT_EQ(read->owner.dateOfBirth, (Configuration::Day{1990, 5, 1}));
     EXPECT_EQ(read->owner.biologicalSex, 3);
@@ -106,6 +108,7 @@ TEST(Configuration, NamesFileLineAndKeyOfTheFirstMistake) {
          "2: device_data.photos: \"/a/${PHOTOS\" has a $ that no variable name follows"},
         {"[device_data]\nphotos = [\"~eve/x\"]\n",
          "2: device_data.photos: \"~eve/x\" cannot expand another user's home folder"},
+        {"[device_data]\ngazetteer = [\"a\"]\n", "2: device_data.gazetteer: must be a file's name"},
         {"[device_data]\nphotos = [\"\"]\n", "2: device_data.photos: \"\" must not be empty"},
         {"[owner]\ndate_of_birth = \"1990-05-01\"\n", "2: owner.date_of_birth: must be a date"},
         {"[owner]\ndate_of_birth = 1990-05-01T00:00:00Z\n", "2: owner.date_of_birth: must be a"},

@@ -2,6 +2,7 @@
 // The daemon as a process on a bus of its own, with its indexer and real files.
 #include <SQLiteCpp/SQLiteCpp.h>
 #include <fcntl.h>
+#include <fmt/format.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/wait.h>
@@ -139,6 +140,33 @@ TEST_F(DaemonProcess, WhatWasAnsweredOutlivesAKillAndFilesBecomeBundles) {
     EXPECT_THAT(status.problems[0], HasSubstr("broken.gpx"));
     EXPECT_EQ(client->fetchEventsWithOptions({}).value().size(), 2u) << "collected once";
     EXPECT_EQ(end(SIGTERM), 0);
+}
+
+/// A stay of twenty minutes, and where the owner went from there.
+std::string stayedAt(const std::string& day, double latitude) {
+    std::string points;
+    const auto start = parseISO8601(day + "T10:00:00Z")->date;
+    for (int minute = 0; minute <= 20; ++minute) {
+        points += fmt::format(R"(<trkpt lat="{}" lon="13.6"><time>{}</time></trkpt>)", latitude,
+                              formatISO8601(start + 60 * minute));
+    }
+    return "<gpx version=\"1.1\"><trk><trkseg>" + points + "</trkseg></trk></gpx>";
+}
+
+TEST_F(DaemonProcess, ADeletedTrackTakesItsVisitsAlongAtThePurge) {
+    folder.write("tracks/friday.gpx", stayedAt("2024-06-14", 47.5));
+    folder.write("tracks/saturday.gpx", stayedAt("2024-06-15", 47.6));
+    startAndConnect();
+    ASSERT_FALSE(client->collectEvents());
+    ASSERT_EQ(client->fetchEventsWithOptions({}).value().size(), 2u);
+    ASSERT_FALSE(client->purgeEvents());
+    EXPECT_EQ(client->fetchEventsWithOptions({}).value().size(), 2u);
+    std::filesystem::remove(folder / "tracks/friday.gpx");
+    ASSERT_FALSE(client->purgeEvents());
+    const auto left = client->fetchEventsWithOptions({}).value();
+    ASSERT_EQ(left.size(), 1u);
+    EXPECT_EQ(formatISO8601(left[0]->startDate()), "2024-06-15T10:00:00Z");
+    EXPECT_EQ(formatISO8601(left[0]->endDate()), "2024-06-15T10:20:00Z");
 }
 
 TEST_F(DaemonProcess, ASongOnRepeatBecomesABundle) {

@@ -20,8 +20,9 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
     EXPECT_THAT(
         universe.serviceNames(),
         ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
-                    "PhotoManager", "VitalsManager", "NowPlayingMediaManager", "DefaultsManager",
-                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier",
+                    "PhotoManager", "RoutineServiceManager", "VitalsManager",
+                    "NowPlayingMediaManager", "DefaultsManager", "EventManager",
+                    "EventBundleManager", "Server", "DaemonClientNotifier",
                     "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
                     "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
                     "EventPurgeSchedulerNotifier", "DaemonAnalytics"));

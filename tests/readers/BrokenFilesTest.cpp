@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "PlaceFiles.h"
 #include "SampleFiles.h"
 #include "readers/TrackReader.h"
 
@@ -137,7 +138,8 @@ TEST(BrokenFiles, AFailingReadIsTheReason) {
     const ReadBlock fails = [](std::span<char>) -> std::expected<std::size_t, std::string> {
         return std::unexpected("read: Input/output error");
     };
-    EXPECT_EQ(readTrack(fails, kReadOn).error(), "read: Input/output error");
+    PlaceLines places;
+    EXPECT_EQ(readTrack(fails, kReadOn, places).error(), "read: Input/output error");
     EXPECT_EQ(readPhotoFile(-1, kReadOn).error(), "stat: Bad file descriptor");
 }
 

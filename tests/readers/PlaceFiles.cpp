@@ -13,6 +13,7 @@
 #include "readers/GeoJsonReader.h"
 #include "readers/LocationHistoryReader.h"
 #include "readers/OwnTracksReader.h"
+#include "readers/TrackReader.h"
 
 namespace keepsakes {
 
@@ -41,6 +42,8 @@ ReadBlock inBlocks(std::string_view bytes, std::size_t most) {
 std::expected<FileRecords, std::string> read(std::string_view bytes, std::size_t block,
                                              LocationSink& places) {
     switch (kindOf(std::as_bytes(std::span(bytes)))) {
+        case FileKind::track:
+            return readTrack(inBlocks(bytes, block), kReadOn, places);
         case FileKind::fit:
             return readFit(inBlocks(bytes, block), kReadOn, places);
         case FileKind::ownTracks:

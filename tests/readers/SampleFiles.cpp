@@ -11,6 +11,7 @@
 #include <span>
 #include <stdexcept>
 
+#include "PlaceFiles.h"
 #include "platform/ActivityCatalogue.h"
 
 namespace keepsakes {
@@ -115,13 +116,14 @@ std::string heif(const Exiv2::ExifData& exif, const std::string& xmp) {
 }  // namespace
 
 std::expected<FileRecords, std::string> readBytes(std::string_view bytes) {
+    PlaceLines places;
     const int fd = ::memfd_create("sample", MFD_CLOEXEC);
     if (fd < 0 || ::write(fd, bytes.data(), bytes.size()) != static_cast<ssize_t>(bytes.size())) {
         throw std::runtime_error("no memory file");
     }
     const auto kind = kindOf(std::as_bytes(std::span(bytes)));
     auto records =
-        kind == FileKind::photo ? readPhotoFile(fd, kReadOn) : readTrackFile(fd, kReadOn);
+        kind == FileKind::photo ? readPhotoFile(fd, kReadOn) : readTrackFile(fd, kReadOn, places);
     ::close(fd);
     return records;
 }

@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "PlaceFiles.h"
 #include "SampleFiles.h"
 #include "platform/ActivityCatalogue.h"
 #include "readers/ActivityWords.h"
@@ -40,6 +41,30 @@ void check(const std::vector<Case>& cases) {
     for (const auto& [what, file, expected] : cases) {
         EXPECT_EQ(told(readBytes(file)), expected) << what;
     }
+}
+
+TEST(TrackReader, HandsOnPointsAndTheOwnersWaypoints) {
+    const auto file = gpx(
+        "<wpt lat='47.07' lon='15.44'><name> Grandma&apos;s </name></wpt>"
+        "<wpt lat='47.08' lon='15.45'><name>Flat</name><sym>Residence</sym></wpt>"
+        "<wpt lat='47.09' lon='15.46'><type>Work</type><name>Tower</name></wpt>"
+        "<wpt lat='1' lon='2'><name>LAP001</name></wpt><wpt lat='1' lon='2'><name>12</name></wpt>"
+        "<wpt lat='1' lon='2'><desc>nameless</desc></wpt><wpt lat='91' lon='2'><name>Off</name>"
+        "</wpt><rte><rtept lat='1' lon='2'><name>Turn</name></rtept></rte>" +
+        track("driving", point("2024-06-15T08:00:00Z", 47.1) + point("1970-01-01T00:00:00Z") +
+                             "<trkpt lat='47' lon='15'/>" +
+                             "<trkpt><time>2024-06-15T08:00:05Z</time></trkpt>" +
+                             point("2024-06-15T08:01:00Z", 47.2)));
+    EXPECT_EQ(toldPlaces(file),
+              "place 47.0700 15.4400 'Grandma's'\nplace 47.0800 15.4500 'Flat' home\n"
+              "place 47.0900 15.4600 'Tower' work\n2024-06-15T08:00:00Z 47.1000 15.0000\n"
+              "2024-06-15T08:01:00Z 47.2000 15.0000\n");
+    EXPECT_EQ(brokenCut(file), "");
+    EXPECT_EQ(toldPlaces(tcx("<Activity Sport='Biking'><Lap><Track><Trackpoint><Time>2024-06-15T08:"
+                             "00:00Z</Time><Position><LatitudeDegrees>47</LatitudeDegrees>"
+                             "<LongitudeDegrees>15</LongitudeDegrees></Position></Trackpoint>"
+                             "</Track></Lap></Activity>")),
+              "2024-06-15T08:00:00Z 47.0000 15.0000\n");
 }
 
 TEST(TrackReader, ReadsOneWorkoutForEachTrackOfAGpxFile) {

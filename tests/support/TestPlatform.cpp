@@ -81,6 +81,38 @@ PhotoAnalysis::Summary FakePhotoAnalysis::summary(std::span<const std::string> i
     });
 }
 
+void FakeRoutineService::fetchStoredVisits(const VisitFetchOptions& options,
+                                           std::function<void(Visits)> handler) {
+    queue_.async([this, options, handler = std::move(handler)] {
+        asked.push_back(options.interval);
+        if (visitsError) {
+            handler(std::unexpected(*visitsError));
+            return;
+        }
+        std::vector<RoutineVisit> found;
+        std::ranges::copy_if(stored, std::back_inserter(found), [&options](const auto& visit) {
+            return visit.entry <= options.interval.end &&
+                   visit.exit.value_or(KSDate::distantFuture()) >= options.interval.start;
+        });
+        handler(std::move(found));
+    });
+}
+
+void FakeRoutineService::fetchLocationsOfInterestVisitedBetween(
+    KSDate start, KSDate end, std::function<void(Locations)> handler) {
+    queue_.async([this, start, end, handler = std::move(handler)] {
+        askedLocations.push_back({start, end});
+        handler(locationsError ? Locations(std::unexpected(*locationsError))
+                               : Locations(locations));
+    });
+}
+
+void FakeRoutineService::fetchRoutineModeFromLocation(GeoPoint, std::function<void(Mode)> handler) {
+    queue_.async([this, handler = std::move(handler)] {
+        handler(modeError ? Mode(std::unexpected(*modeError)) : Mode(modeCode));
+    });
+}
+
 void FakeNowPlayingStream::read(KSDate start, const EachRecord& each,
                                 const std::function<void(OptionalError)>& completion) {
     asked.push_back(start);
@@ -197,6 +229,7 @@ TestPlatform::TestPlatform() {
     services.analytics = &analytics;
     services.healthStore = &health;
     services.photoAnalysis = &photos;
+    services.routineService = &routine;
     services.nowPlayingStream = &media;
     services.deviceData = &deviceData;
     services.activities = &activities;

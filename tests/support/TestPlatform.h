@@ -20,6 +20,7 @@
 #include "platform/MediaStream.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
+#include "platform/RoutineService.h"
 #include "platform/SystemNotifications.h"
 #include "platform/UserDefaults.h"
 #include "support/FakeDeviceState.h"
@@ -71,6 +72,29 @@ class FakePhotoAnalysis final : public PhotoAnalysis {
   private:
     template <class Wanted>
     Summary summaryOf(const Wanted& wanted);
+};
+
+/// A routine service in memory, likewise. Questions and answers go over its queue.
+class FakeRoutineService final : public RoutineService {
+  public:
+    std::vector<RoutineVisit> stored;
+    std::vector<LocationOfInterest> locations;
+    std::uint64_t modeCode = 0;
+    std::optional<KSError> visitsError;
+    std::optional<KSError> locationsError;
+    std::optional<KSError> modeError;
+    std::vector<KSDateInterval> asked;           ///< For visits.
+    std::vector<KSDateInterval> askedLocations;  ///< For locations of interest.
+
+    void fetchStoredVisits(const VisitFetchOptions& options,
+                           std::function<void(Visits)> handler) override;
+    void fetchLocationsOfInterestVisitedBetween(KSDate start, KSDate end,
+                                                std::function<void(Locations)> handler) override;
+    void fetchRoutineModeFromLocation(GeoPoint location,
+                                      std::function<void(Mode)> handler) override;
+
+  private:
+    WorkQueue queue_{"FakeRoutineService"};
 };
 
 /// A now-playing stream in memory, likewise.
@@ -142,6 +166,7 @@ struct TestPlatform {
     Problems problems;
     FakeHealthStore health;
     FakePhotoAnalysis photos;
+    FakeRoutineService routine;
     FakeNowPlayingStream media;
     FakeAnalytics analytics;
     FakeDefaults defaults;
