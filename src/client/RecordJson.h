@@ -4,6 +4,7 @@
 #include <expected>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/KSError.h"
 #include "model/KSEvent.h"

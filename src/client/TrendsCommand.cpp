@@ -3,13 +3,15 @@
 #include <fmt/format.h>
 
 #include <charconv>
+#include <expected>
+#include <optional>
+#include <string>
 #include <vector>
 
 #include "client/Commands.h"
 #include "client/RecordJson.h"
 #include "client/TrendView.h"
 #include "client/Words.h"
-#include "core/Calendar.h"
 #include "core/Clock.h"
 #include "trends/AnalyticsPlans.h"
 #include "trends/TrendsKeys.h"

@@ -4,7 +4,9 @@
 
 #include <array>
 #include <cmath>
+#include <memory>
 #include <mutex>
+#include <optional>
 
 #include "analytics/AnalyticsSubmission.h"
 #include "analytics/KSMetric.h"
