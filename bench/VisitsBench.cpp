@@ -141,7 +141,7 @@ void rehydrate(const fs::path& index) {
     platform.services.routineService = &service;
     TestUniverse universe(platform.services);
     universe.add("TocsinNotifier",
-                 std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock));
+                 std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.services));
     universe.add("PersistenceManager", KSPersistenceManager::initWithUniverse(universe));
     universe.add("EventStore", KSEventStore::initWithUniverse(universe));
     const auto routine = KSRoutineServiceManager::initWithUniverse(universe);

@@ -133,10 +133,8 @@ void KSDaemonAnalyticsManager::listenTo(
     dispatchers_.push_back(std::move(dispatcher));
 }
 
-KSDaemonAnalyticsManager::DeviceStates KSDaemonAnalyticsManager::deviceStates() {
-    DeviceStates states;
-    queue_.sync([this, &states] { states = deviceStates_; });
-    return states;
+KSDaemonAnalyticsManager::DeviceStates KSDaemonAnalyticsManager::deviceStates() const {
+    return {stateOnCharger_, stateUnlocked_, optInDNU_, optInIHA_};
 }
 
 void KSDaemonAnalyticsManager::recordLaunch() {
@@ -147,19 +145,20 @@ void KSDaemonAnalyticsManager::recordLaunch() {
 }
 
 void KSDaemonAnalyticsManager::onDeviceState(std::int32_t identifier, const KSDictionary& payload) {
-    const auto take = [&payload](bool& state, std::string_view key) {
-        state = valueForKey(payload, key).asBool().value_or(state);
+    const auto take = [&payload](std::atomic<bool>& state, std::string_view key) {
+        if (const auto told = valueForKey(payload, key).asBool()) state = *told;
     };
     switch (identifier) {
         case 1:
-            take(deviceStates_.optInDNU, "optInDNU");
-            take(deviceStates_.optInIHA, "optInIHA");
+            take(optInDNU_, "optInDNU");
+            take(optInIHA_, "optInIHA");
             break;
         case 2:
-            take(deviceStates_.stateUnlocked, "stateUnlocked");
+            take(stateUnlocked_, "isUnlocked");  // as the notifier names it
+            take(stateUnlocked_, "stateUnlocked");
             break;
         case 4:
-            take(deviceStates_.stateOnCharger, "stateOnCharger");
+            take(stateOnCharger_, "stateOnCharger");
             break;
         default:
             break;

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <array>
+#include <atomic>
 #include <cstdint>
 #include <filesystem>
 #include <memory>
@@ -43,7 +44,7 @@ class KSDaemonAnalyticsManager final : public KSService {
     KSDaemonAnalyticsManager(const KSDaemonAnalyticsManager&) = delete;
     KSDaemonAnalyticsManager& operator=(const KSDaemonAnalyticsManager&) = delete;
 
-    DeviceStates deviceStates();
+    DeviceStates deviceStates() const;
 
     /// What the payload says of itself, or else whether all nine sources and the database did well.
     static bool checkTriggerSuccess(const KSDictionary& payload);
@@ -78,8 +79,11 @@ class KSDaemonAnalyticsManager final : public KSService {
     const PlatformServices& platform_;
     const std::vector<double> shortBins_;  // hours, up to four days
     std::vector<std::shared_ptr<KSDispatcher>> dispatchers_;
-    DeviceStates deviceStates_;  // only on the queue
-    WorkQueue queue_;            // last: its end waits for tasks that use the members above
+    std::atomic<bool> stateOnCharger_ = false;
+    std::atomic<bool> stateUnlocked_ = false;
+    std::atomic<bool> optInDNU_ = false;
+    std::atomic<bool> optInIHA_ = false;
+    WorkQueue queue_;  // last: its end waits for tasks that use the members above
 };
 
 }  // namespace keepsakes

@@ -22,7 +22,7 @@ constexpr auto kBars = std::to_array<std::string_view>({"▁", "▂", "▃", "�
 constexpr std::string_view kNoBar = "·";
 
 std::string timeSpan(double seconds) {
-    if (seconds < 0) return "-" + timeSpan(-seconds);
+    if (seconds < 0) return fmt::format("-{}", timeSpan(-seconds));
     if (seconds == 0) return "none";
     if (seconds < 59.5) return fmt::format("{:.0f} s", seconds);
     const double minutes = std::round(seconds / 60);
@@ -159,7 +159,10 @@ KSDictionary TrendView::json() const {
                           {"words", words()}};
     if (findings_) {
         KSArray values;
-        for (const auto& value : days()) values.push_back(value ? KSValue(*value) : KSValue());
+        for (const auto& value : days()) {
+            auto& told = values.emplace_back();
+            if (value) told = *value;
+        }
         analysis.emplace("days", std::move(values));
     }
     if (findings_ && findings_->result) {

@@ -38,6 +38,8 @@ struct StandardFolders {
     std::filesystem::path analyticsFile() const { return state / "analytics.jsonl"; }
     /// When the background activities ran last.
     std::filesystem::path activitiesFile() const { return state / "activities.plist"; }
+    /// Since which start of the machine the session has been unlocked.
+    std::filesystem::path unlockFile() const { return state / "unlocked-boot"; }
 
     /// An error when a default is needed and there is no home folder.
     static std::expected<StandardFolders, KSError> find(

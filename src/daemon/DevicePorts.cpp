@@ -41,11 +41,12 @@ class NoContentProtection final : public LockState {
 };
 
 /// logind is asked only where the owner wants the database to wait for it.
-std::unique_ptr<LockState> lockStateFor(const Configuration& configuration, BusThread& bus,
+std::unique_ptr<LockState> lockStateFor(const Configuration& configuration,
+                                        const StandardFolders& folders, BusThread& bus,
                                         Problems& problems) {
     if (!configuration.device.contentProtection) return std::make_unique<NoContentProtection>();
     LogindLockState::Owner owner{::getuid(), processEnvironment()("XDG_SESSION_ID")};
-    return std::make_unique<LogindLockState>(bus, std::move(owner), problems);
+    return std::make_unique<LogindLockState>(bus, std::move(owner), folders.unlockFile(), problems);
 }
 
 OwnerFacts ownerFacts(const Configuration& configuration) {
@@ -111,7 +112,7 @@ struct DevicePorts::Adapters {
         : clock(std::move(clockToUse)),
           policy(configuration, std::move(reload), *clock, notifications, problems),
           systemBus(BusThread::Bus::system, *clock),
-          lock(lockStateFor(configuration, systemBus, problems)),
+          lock(lockStateFor(configuration, folders, systemBus, problems)),
           power(systemBus),
           defaults(folders.defaultsFolder()),
           analytics(folders.analyticsFile(), *clock),

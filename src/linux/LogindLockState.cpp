@@ -1,12 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "linux/LogindLockState.h"
 
+#include <fmt/format.h>
 #include <systemd/sd-bus.h>
 
 #include <algorithm>
+#include <fstream>
 #include <utility>
 #include <vector>
 
+#include "core/Files.h"
 #include "core/Log.h"
 #include "core/Problems.h"
 #include "linux/BusProperties.h"
@@ -23,8 +26,18 @@ constexpr const char* kUserInterface = "org.freedesktop.login1.User";
 constexpr const char* kSessionInterface = "org.freedesktop.login1.Session";
 
 constexpr std::string_view kNobodyTells =
-    "content_protection is on, but there is no logind to tell of the session's lock: the device "
-    "counts as locked, and the database opens with the first request that needs it";
+    "content_protection is on, but there is no logind to tell of the session's lock: until there "
+    "is, the device counts as locked and the database stays closed";
+
+/// Another one after each start of the machine; nothing where the kernel tells none.
+std::string bootIdentifier() {
+    std::ifstream in("/proc/sys/kernel/random/boot_id");
+    std::string identifier;
+    std::getline(in, identifier);
+    return identifier;
+}
+
+constexpr std::uintmax_t kLongestMemory = 256;
 
 BusThread::Build text(std::string argument) {
     return [argument = std::move(argument)](sd_bus_message* message) {
@@ -40,13 +53,17 @@ struct LogindLockState::Session {
     std::optional<bool> isLocked;
 };
 
-LogindLockState::LogindLockState(BusThread& bus, Owner owner, Problems& problems)
+LogindLockState::LogindLockState(BusThread& bus, Owner owner, std::filesystem::path memory,
+                                 Problems& problems)
     : owner_(std::move(owner)),
+      memory_(std::move(memory)),
       problems_(problems),
       reader_(
           bus, kService, [this] { beginReading(); }, [this] { tell(); },
           [this] { becameUnavailable(); }) {
     bus.follow(*this);
+    const auto remembered = readFile(memory_, kLongestMemory);
+    unlockedSinceBoot_ = remembered && !remembered->empty() && *remembered == bootIdentifier();
 }
 
 LogindLockState::~LogindLockState() = default;
@@ -174,8 +191,16 @@ void LogindLockState::tell() {
 
 void LogindLockState::updateState() {
     const int state = isLocked_ ? kLocked : (isLockRequested_ ? kLocking : kUnlocked);
-    if (state == kUnlocked) unlockedSinceBoot_ = true;
+    if (state == kUnlocked && !unlockedSinceBoot_.exchange(true)) rememberUnlock();
     if (state_.exchange(state) != state) observers_.notify();
+}
+
+void LogindLockState::rememberUnlock() {
+    auto error = makePrivateFolder(memory_.parent_path());
+    if (!error) error = replaceFile(memory_, bootIdentifier());
+    if (error) {
+        logWarning(fmt::format("the first unlock is not remembered: {}", error->description()));
+    }
 }
 
 }  // namespace keepsakes

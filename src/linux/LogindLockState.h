@@ -4,6 +4,7 @@
 #include <sys/types.h>
 
 #include <atomic>
+#include <filesystem>
 #include <list>
 #include <optional>
 #include <string>
@@ -21,7 +22,8 @@ class Problems;
 /// The owner's session is the one the daemon belongs to, else the user's display, else one that is
 /// active. It is locked while its LockedHint says so; between a request to lock and that, it is
 /// "locking". An owner without a session counts as locked. Until logind has answered the state is
-/// an error; should it go away or talk nonsense, the last state stays.
+/// an error; should it go away or talk nonsense, the last state stays. That the device was unlocked
+/// since it started is remembered in a file, for a daemon that is started again.
 class LogindLockState final : public LockState, private BusFollower {
   public:
     /// Whose session; the identifier is that of the daemon's own, where it has one.
@@ -32,7 +34,8 @@ class LogindLockState final : public LockState, private BusFollower {
     /// Candidates beyond these are not looked at.
     static constexpr std::size_t kMostSessions = 16;
 
-    LogindLockState(BusThread& bus, Owner owner, Problems& problems);
+    /// `memory` is the file; one that cannot be read or written is as none.
+    LogindLockState(BusThread& bus, Owner owner, std::filesystem::path memory, Problems& problems);
     ~LogindLockState() override;
 
     bool formattedForContentProtection() const override { return true; }
@@ -58,8 +61,10 @@ class LogindLockState final : public LockState, private BusFollower {
     void readSession(const std::string& path);
     void tell();
     void updateState();
+    void rememberUnlock();
 
     const Owner owner_;
+    const std::filesystem::path memory_;
     Problems& problems_;
 
     // Only on the bus thread.

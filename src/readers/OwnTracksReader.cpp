@@ -100,9 +100,6 @@ class Recording {
         ++readable_;
     }
 
-    /// A line too long to be a location.
-    void longLine() { ++lines_; }
-
     std::expected<FileRecords, std::string> finish() const {
         if (lines_ > 0 && readable_ == 0) {
             return std::unexpected("no line has a time, a kind and a message");
@@ -142,11 +139,10 @@ std::expected<void, std::string> readLines(const ReadBlock& read, Recording& rec
         std::string_view rest(block.data(), *count);
         while (!rest.empty() || *count == 0) {
             const auto end = rest.find('\n');
-            // One byte beyond the limit is kept: it tells that the line is too long.
-            const auto piece = rest.substr(0, end);
-            line += piece.substr(0, limits::kLongestLine + 1 - line.size());
+            // A longer line is no location; cut, its message is none either.
+            line += rest.substr(0, end).substr(0, limits::kLongestLine - line.size());
             if (end == std::string_view::npos && *count > 0) break;
-            line.size() > limits::kLongestLine ? recording.longLine() : recording.line(line);
+            recording.line(line);
             line.clear();
             if (*count == 0) return {};
             rest.remove_prefix(end + 1);

@@ -10,6 +10,7 @@
 #include "core/PropertyList.h"
 #include "notify/KSDispatcher.h"
 #include "notify/KSTocsinNotifier.h"
+#include "platform/DeviceState.h"
 #include "platform/PlatformServices.h"
 
 namespace keepsakes {
@@ -80,6 +81,11 @@ void KSPersistenceManager::checkAvailabilityWithCompletionHandler(
 
 OptionalError KSPersistenceManager::load() {
     if (managedObjectContext_) return std::nullopt;
+    // As a file that the device keeps locked away: it opens after the first unlock and stays open.
+    const auto& lock = *platform_.lockState;
+    if (lock.formattedForContentProtection() && !lock.unlockedSinceBoot()) {
+        return databaseUnavailableError();
+    }
     auto opened = ManagedObjectContext::open(platform_.cacheFolder / kStoreFile,
                                              *platform_.problems, changeObserver_);
     if (!opened) {

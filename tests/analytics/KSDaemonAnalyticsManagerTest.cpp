@@ -196,13 +196,15 @@ TEST_F(DaemonAnalytics, KeepsTheDevicesStatesAndOutlivesAnUnwritablePlace) {
     WorkerThreads::shared().settle();
     platform.folder.write("cache", "a file where the folder should be");
     start();
-    tell("TocsinNotifier", 2, {{"stateUnlocked", true}});
+    tell("TocsinNotifier", 2, {{"isUnlocked", true}});
+    EXPECT_TRUE(manager->deviceStates().stateUnlocked);
+    tell("TocsinNotifier", 2, {{"stateUnlocked", false}});
     tell("TocsinNotifier", 4, {{"stateOnCharger", true}, {"optInDNU", false}});
     tell("TocsinNotifier", 4, {{"stateOnCharger", "yes"}});
     tell("TocsinNotifier", 1, {{"optInIHA", false}});
     const auto states = manager->deviceStates();
     EXPECT_TRUE(states.stateOnCharger);
-    EXPECT_TRUE(states.stateUnlocked);
+    EXPECT_FALSE(states.stateUnlocked);
     EXPECT_TRUE(states.optInDNU);
     EXPECT_FALSE(states.optInIHA);
     EXPECT_EQ(sentFor(0, {}).at("triggerTimeSinceLastLaunch"), KSValue(-1));

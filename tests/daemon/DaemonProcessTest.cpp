@@ -235,6 +235,7 @@ TEST_F(DaemonProcess, StartsLockedAndOpensTheDatabaseWithTheUnlock) {
     configure("tracks = []\nphotos = []\n[device]\ncontent_protection = true\n");
     startAndConnect();
     EXPECT_FALSE(client->status()->databaseAvailable);
+    EXPECT_EQ(client->fetchEventsWithOptions({}).error().code, 16);
     logind.end();
     logind.startWithUser();
     logind.addSession("c1", true, true);
@@ -252,6 +253,7 @@ TEST_F(DaemonProcess, ReportsWhatItIsDoingAndThatItsSettingsBroke) {
     waitForLog("report: ends");
     const auto report = log();
     for (const auto* text : {"report:   DaemonClientNotifier: somebody listens", "KSEventManager",
+                             "EventPurgeScheduler: com.brindle.keepsakesd.eventPurge: due in",
                              "DiagnosticReport: running", "events 0, bundles 0", "problems 1",
                              "the settings before it stay in force"}) {
         EXPECT_THAT(report, HasSubstr(text));

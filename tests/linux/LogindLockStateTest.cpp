@@ -9,6 +9,7 @@
 
 #include "core/Problems.h"
 #include "support/MockService.h"
+#include "support/TemporaryFolder.h"
 
 namespace keepsakes {
 namespace {
@@ -31,7 +32,8 @@ class Logind : public testing::Test {
         lock.reset();
         bus = std::make_unique<BusThread>(BusThread::Bus::system, clock);
         lock = std::make_unique<LogindLockState>(
-            *bus, LogindLockState::Owner{::getuid(), std::move(ownSession)}, problems);
+            *bus, LogindLockState::Owner{::getuid(), std::move(ownSession)},
+            folder / "state/unlocked", problems);
         changes = Semaphore();
         observation = lock->observe(queue, [this] { changes.signal(); });
         bus->start();
@@ -40,6 +42,7 @@ class Logind : public testing::Test {
     int next() { return clock.wait(changes, kDeadlineSeconds) ? lock->currentState() : -100; }
 
     SystemClock clock;
+    TemporaryFolder folder;
     Problems problems;
     MockLogind logind;
     std::unique_ptr<BusThread> bus;
@@ -118,6 +121,22 @@ TEST_F(Logind, TheLastStateOutlivesTheServiceAndItsNonsense) {
     EXPECT_EQ(next(), kLocked) << "back, and nobody is logged in";
     logind.addSession("c2", true, false);
     EXPECT_EQ(next(), kUnlocked);
+}
+
+TEST_F(Logind, RemembersTheFirstUnlockUntilTheMachineStartsAgain) {
+    logind.startWithUser();
+    logind.addSession("c1", true, false);
+    follow();
+    EXPECT_EQ(next(), kUnlocked);
+    logind.setLocked("c1", true);
+    EXPECT_EQ(next(), kLocked);
+    follow();
+    EXPECT_TRUE(lock->unlockedSinceBoot()) << "before logind has answered";
+    folder.write("state/unlocked", "the boot before");
+    follow();
+    EXPECT_FALSE(lock->unlockedSinceBoot());
+    EXPECT_EQ(next(), kLocked);
+    EXPECT_FALSE(lock->unlockedSinceBoot());
 }
 
 }  // namespace

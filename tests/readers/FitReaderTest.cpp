@@ -143,9 +143,9 @@ TEST(FitReader, RefusesDamage) {
     const std::vector<std::pair<std::string, std::string>> cases{
         {changed(50, '!'), "the checksum is wrong"},
         {changed(2, '!'), "byte 0: the header's checksum is wrong"},
-        {run().file() + run().file().substr(0, 14) + "\x07",
+        {run().file() + run().file().substr(0, 14) + "\x01",
          "byte " + std::to_string(run().file().size() + 14) +
-             ": data of message 7, which is not defined"},
+             ": data of message 1, which is not defined"},
         {run().file() + "garbage that is no file", "byte " + runSize + ": no FIT header"},
         {run().file().substr(0, 13), "byte 0: the header is cut"},
     };

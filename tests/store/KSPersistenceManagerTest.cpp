@@ -14,26 +14,46 @@ namespace {
 using testing::ElementsAre;
 using Persistence = StoreFixture;
 
-TEST_F(Persistence, OpensWithTheUnlockNoticeOrTheFirstCheck) {
+TEST_F(Persistence, OpensWithTheFirstUnlockOrACheckAfterIt) {
     EXPECT_TRUE(manager->isAvailable()) << "a device without content protection opens at once";
 
     close();
     platform.lock.protects = true;
     platform.lock.current = 1;
     open();
-    EXPECT_FALSE(manager->isAvailable());
+    const auto check = [this] {
+        bool opened = false;
+        manager->checkAvailabilityWithCompletionHandler(
+            [&opened](bool available, const OptionalError& error) {
+                EXPECT_EQ(available, !error);
+                opened = available;
+            });
+        return opened;
+    };
+    EXPECT_FALSE(check()) << "protected";
     Answer answer;
     store->storeEvents({makeWorkout(1, 1, 2, "a")}, into(answer));
     EXPECT_EQ(answer.error, "database is not avaialble");
-    manager->checkAvailabilityWithCompletionHandler([](bool available, const OptionalError& error) {
-        EXPECT_TRUE(available);
-        EXPECT_FALSE(error);
-    });
+    EXPECT_THAT(platform.problems.list(), ElementsAre()) << "which is no fault";
+
+    platform.lock.unlocked = true;
+    EXPECT_TRUE(check()) << "though it is locked again";
     EXPECT_EQ(storeAll({makeWorkout(1, 1, 2, "a")}), (Answer{"", 1}));
+
+    close();
+    platform.lock.unlocked = false;
+    open();
+    EXPECT_FALSE(manager->isAvailable());
+    platform.lock.unlocked = true;
+    platform.lock.current = 0;
+    platform.lock.observers.notify();
+    WorkerThreads::shared().settle();
+    EXPECT_TRUE(manager->isAvailable());
 }
 
 TEST_F(Persistence, AnUnlockNoticeOfEitherValueOpens) {
     platform.lock.protects = true;
+    platform.lock.unlocked = true;
     platform.lock.current = 1;
     close();
     universe = std::make_unique<TestUniverse>(platform.services);
