@@ -64,15 +64,18 @@ using PlacesReader = std::function<std::expected<FileRecords, std::string>(
     const ReadBlock&, const ReaderContext&, LocationSink&)>;
 
 /// Ends the run unless the bytes tell the same in small blocks, a beginning of it when they are
-/// cut, and only records that the index may hold.
-inline void checkReader(const PlacesReader& reader, std::string_view bytes, std::size_t seed) {
+/// cut, and only records that the index may hold. A format of lines is cut at their ends: with
+/// something behind its message a line is none, and cut before that it is one.
+inline void checkReader(const PlacesReader& reader, std::string_view bytes, std::size_t seed,
+                        bool inLines = false) {
     CheckedPlaces whole;
     CheckedPlaces pieces;
     CheckedPlaces part;
     const auto records = reader(inBlocks(bytes, 0), kFuzzNow, whole);
     check(records == reader(inBlocks(bytes, 1 + seed), kFuzzNow, pieces) && whole == pieces,
           "blocks change nothing");
-    const auto length = bytes.empty() ? 0 : seed * 31 % bytes.size();
+    auto length = bytes.empty() ? 0 : seed * 31 % bytes.size();
+    if (inLines) length = bytes.substr(0, length).rfind('\n') + 1;
     const auto cut = reader(inBlocks(bytes.substr(0, length), 0), kFuzzNow, part);
     check(part.isBeginningOf(whole), "a part tells a part");
     check(cut || !cut.error().empty(), "a refusal has a reason");

@@ -18,6 +18,7 @@ using namespace keepsakes;
 struct Target {
     PlacesReader reader;
     std::string_view seed;
+    bool inLines = false;
 };
 
 const Target kTargets[] = {
@@ -48,7 +49,8 @@ const Target kTargets[] = {
     {readOwnTracks,
      "2024-06-15T08:00:05Z\t*  \t{\"_type\":\"location\",\"tst\":1718438400,\"lat\":47.0,"
      "\"lon\":15.5,\"acc\":8}\n2024-06-15T08:00:05Z\t*\t{\"_type\":\"waypoint\",\"desc\":"
-     "\"Work\",\"lat\":47.2,\"lon\":15.5}\n"},
+     "\"Work\",\"lat\":47.2,\"lon\":15.5}\n",
+     true},
 };
 
 }  // namespace
@@ -70,7 +72,8 @@ extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t s
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     if (size < 2) return 0;
     const std::string bytes(data + 2, data + size);
-    checkReader(kTargets[data[0] % std::size(kTargets)].reader, bytes,
-                data[0] + static_cast<std::size_t>(data[1]) * 256U);
+    const auto& target = kTargets[data[0] % std::size(kTargets)];
+    checkReader(target.reader, bytes, data[0] + static_cast<std::size_t>(data[1]) * 256U,
+                target.inLines);
     return 0;
 }

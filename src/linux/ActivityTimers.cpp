@@ -81,7 +81,8 @@ class ActivityTimers::State : public std::enable_shared_from_this<State> {
         std::optional<KSDate> lastStart;  // of the last run that finished
         bool registered = false;
         bool running = false;
-        double due = 0;  // on the clock's elapsed time, as what follows
+        bool waits = false;  // for power, and the log says so
+        double due = 0;      // on the clock's elapsed time, as what follows
         double started = 0;
         KSDate startDate;
         ActivityBlock block = nullptr;
@@ -100,6 +101,7 @@ class ActivityTimers::State : public std::enable_shared_from_this<State> {
     }
     void reconsider();
     void startWhatIsDue();
+    void waitForPower(Activity& activity);
     void start(Activity& activity);
     void ended(const std::string& identifier, bool finished);
     std::string stateOf(const Activity& activity) const;
@@ -186,7 +188,10 @@ void ActivityTimers::State::startWhatIsDue() {
     Activity* next = nullptr;
     for (auto& activity : activities_) {
         if (!activity.isIdle()) continue;
-        if (activity.due <= now && lacksPower(activity)) continue;  // the charger's coming wakes it
+        if (activity.due <= now && lacksPower(activity)) {
+            waitForPower(activity);
+            continue;
+        }
         if (!next || activity.due < next->due) next = &activity;
     }
     if (!next) return;
@@ -200,8 +205,15 @@ void ActivityTimers::State::startWhatIsDue() {
     startWhatIsDue();
 }
 
+/// Its coming is heard of.
+void ActivityTimers::State::waitForPower(Activity& activity) {
+    if (std::exchange(activity.waits, true)) return;
+    logInfo(fmt::format("{} waits for external power", activity.criteria.identifier));
+}
+
 void ActivityTimers::State::start(Activity& activity) {
     activity.running = true;
+    activity.waits = false;
     activity.started = clock_.elapsed();
     activity.startDate = clock_.now();
     logInfo(fmt::format("{} starts", activity.criteria.identifier));

@@ -245,6 +245,24 @@ TEST_F(DaemonProcess, StartsLockedAndOpensTheDatabaseWithTheUnlock) {
     EXPECT_EQ(end(SIGTERM), 0) << log();
 }
 
+TEST_F(DaemonProcess, WaitsForTheChargerWhenToldTo) {
+    MockService::useSessionBusAsSystemBus();
+    MockUPower upower;
+    upower.start();
+    upower.addBattery("battery", 50);
+    configure(
+        "tracks = []\nphotos = []\n[activities]\ncollection = \"1s\"\n"
+        "require_external_power = true\n");
+    startAndConnect();
+    waitForLog("eventCollection waits for external power");
+    EXPECT_EQ(client->status()->lastCollection, 0);
+    upower.update("/org/freedesktop/UPower", "org.freedesktop.UPower", "{'OnBattery': <false>}");
+    waitForLog("eventCollection finished");
+    EXPECT_GT(client->status()->lastCollection, 0);
+    EXPECT_EQ(end(SIGTERM), 0) << log();
+    EXPECT_TRUE(std::filesystem::exists(folder / "state/keepsakesd/activities.plist"));
+}
+
 TEST_F(DaemonProcess, ReportsWhatItIsDoingAndThatItsSettingsBroke) {
     startAndConnect();
     configure("tracks = []\nphotos = 3\n");
