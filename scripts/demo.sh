@@ -35,7 +35,7 @@ toml_strings() {
 newest_record() {
     sqlite3 -readonly "$1" "SELECT max(moment) FROM (SELECT max(end) AS moment FROM workouts
                             UNION ALL SELECT max(end) FROM occasions
-                            UNION ALL SELECT max(end) FROM visits)"
+                            UNION ALL SELECT max(end) FROM visits WHERE place IS NOT NULL)"
 }
 
 # records_by_week INDEX: "2024, week 24: 5 2 12" for the eight newest weeks with records.
@@ -44,7 +44,7 @@ records_by_week() {
         SELECT strftime('  %Y, week %W: ', end + 978307200, 'unixepoch', 'localtime')
                || sum(kind = 1) || ' ' || sum(kind = 2) || ' ' || sum(kind = 3)
         FROM (SELECT end, 1 AS kind FROM workouts UNION ALL SELECT end, 2 FROM occasions
-              UNION ALL SELECT end, 3 FROM visits)
+              UNION ALL SELECT end, 3 FROM visits WHERE place IS NOT NULL)
         GROUP BY strftime('%Y %W', end + 978307200, 'unixepoch', 'localtime')
         ORDER BY max(end) DESC LIMIT 8"
 }
