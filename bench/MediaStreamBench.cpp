@@ -43,7 +43,7 @@ int main() {
 
     TestUniverse universe(platform.services);
     universe.add("TocsinNotifier",
-                 std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock));
+                 std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.services));
     universe.add("PersistenceManager", KSPersistenceManager::initWithUniverse(universe));
     const auto media = KSNowPlayingMediaManager::initWithNowPlayingStream(
         &stream, platform.clock, KSEventStore::initWithUniverse(universe));

@@ -28,7 +28,7 @@ struct Daemon {
     Daemon() {
         setLogLevel(LogLevel::off);
         universe.add("TocsinNotifier",
-                     std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.lock));
+                     std::make_shared<KSTocsinNotifier>("TocsinNotifier", platform.services));
         universe.add("PersistenceManager", KSPersistenceManager::initWithUniverse(universe));
         store = KSEventStore::initWithUniverse(universe);
         universe.add("EventStore", store);

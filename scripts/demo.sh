@@ -51,7 +51,7 @@ records_by_week() {
 
 if [ "$stage" = start ]; then
     scripts/install-dependencies.sh build test
-    build release
+    build release --target keepsakesd keepsakesctl keepsakes-indexer
 
     folders=()
     for folder in "$@"; do
