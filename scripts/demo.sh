@@ -31,18 +31,20 @@ toml_strings() {
     done
 }
 
-# newest_record INDEX: the end of the newest workout or photo occasion, in seconds since 2001.
+# newest_record INDEX: the end of the newest workout, photo occasion or visit, in seconds since 2001.
 newest_record() {
     sqlite3 -readonly "$1" "SELECT max(moment) FROM (SELECT max(end) AS moment FROM workouts
-                            UNION ALL SELECT max(end) FROM occasions)"
+                            UNION ALL SELECT max(end) FROM occasions
+                            UNION ALL SELECT max(end) FROM visits WHERE place IS NOT NULL)"
 }
 
-# records_by_week INDEX: "2024, week 24: 5 2" for the eight newest weeks with records.
+# records_by_week INDEX: "2024, week 24: 5 2 12" for the eight newest weeks with records.
 records_by_week() {
     sqlite3 -readonly "$1" "
         SELECT strftime('  %Y, week %W: ', end + 978307200, 'unixepoch', 'localtime')
-               || sum(workout) || ' ' || sum(NOT workout)
-        FROM (SELECT end, 1 AS workout FROM workouts UNION ALL SELECT end, 0 FROM occasions)
+               || sum(kind = 1) || ' ' || sum(kind = 2) || ' ' || sum(kind = 3)
+        FROM (SELECT end, 1 AS kind FROM workouts UNION ALL SELECT end, 2 FROM occasions
+              UNION ALL SELECT end, 3 FROM visits WHERE place IS NOT NULL)
         GROUP BY strftime('%Y %W', end + 978307200, 'unixepoch', 'localtime')
         ORDER BY max(end) DESC LIMIT 8"
 }
@@ -79,12 +81,12 @@ if [ "$stage" = start ]; then
             --photos "${photos[@]}" --human
         newest=$(newest_record "$home/look.sqlite")
         if [ -z "$newest" ]; then
-            echo "There is neither a workout nor a photo occasion in these folders, so there is" \
+            echo "There is no workout, photo occasion or visit in these folders, so there is" \
                  "nothing to suggest. The lines above say which files were passed over and why."
             exit 1
         fi
         echo
-        echo "By week, the newest first (workouts, photo occasions):"
+        echo "By week, the newest first (workouts, photo occasions, visits):"
         records_by_week "$home/look.sqlite"
         # Midnight after the Sunday that ends the week of the newest record.
         unix=$((${newest%.*} + 978307200))

@@ -124,7 +124,7 @@ IndexWriter::Totals IndexWriter::totals() {
                               " FROM workouts)"),
             .photos = count("SELECT count(*) FROM photos"),
             .occasions = count("SELECT count(*) FROM occasions"),
-            .visits = count("SELECT count(*) FROM visits"),
+            .visits = count("SELECT count(*) FROM visits WHERE place IS NOT NULL"),
             .places = count("SELECT count(*) FROM places")};
 }
 

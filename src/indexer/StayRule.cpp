@@ -44,7 +44,8 @@ GeoPoint blend(const GeoPoint& a, GeoPoint b, double shareOfB) {
 
 double Stay::confidence() const {
     const double share = span.duration() > 0 ? std::min(1.0, covered / span.duration()) : 0;
-    return (covered >= kShortestStay ? 0.5 : 0) + 0.5 * share;
+    const bool isSure = covered >= kShortestStay && share >= kLeastCoveredShare;
+    return (isSure ? 0.5 : 0) + 0.5 * share;
 }
 
 void StayDetector::add(const TrackPoint& point) {

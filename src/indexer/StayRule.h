@@ -21,6 +21,8 @@ inline constexpr double kStayRadius = 100;
 inline constexpr double kShortestStay = 300;
 /// Two points of one place so many seconds apart leave no doubt that the owner stayed between them.
 inline constexpr double kUnbrokenGap = 2700;
+/// Of less than this share of a stay so covered, too little is known to be sure of it.
+inline constexpr double kLeastCoveredShare = 0.1;
 /// After a silence of more seconds, nothing is known to go on.
 inline constexpr double kLongestSilence = 43200;
 /// Who is back at a place after so many seconds never left it.
@@ -46,8 +48,9 @@ struct Stay {
     /// Whether it may go on: no point tells of the owner's leaving for good.
     bool isOpen = false;
 
-    /// 0 to 1. Five covered minutes are worth a half, the covered share of the stay the rest; a
-    /// stay without them, which little but a silence between two points tells of, stays below it.
+    /// 0 to 1. Five covered minutes that are a tenth of the stay are worth a half, the covered
+    /// share the rest; a stay without them, of which little but silence is known, stays below the
+    /// half.
     double confidence() const;
 
     friend bool operator==(const Stay&, const Stay&) = default;

@@ -104,9 +104,11 @@ TEST(StayRule, FindsWhereTheOwnerStayed) {
          "0..900 @0 1600..2200 @0+ "},
         {"a silent night at home",
          [](Track& t) {
-             still(t, 0, 1200, 0), still(t, 30000, 31200, 0), still(t, 32000, 40000, 5000, 7000);
+             still(t, 0, 2400, 0), still(t, 30000, 31200, 0), still(t, 32000, 40000, 5000, 7000);
          },
          "0..31200 @0 32000..39000 @5000?+ "},
+        {"minutes beside a long silence",
+         [](Track& t) { still(t, 0, 600, 0), still(t, 30000, 30300, 0); }, "0..30300 @0?+ "},
         {"little but a silence",
          [](Track& t) {
              t = {at(0, 0), at(20000, 10), at(20100, 900)};
