@@ -23,8 +23,9 @@ namespace {
 /// A photo in a few bytes: its number is its time.
 class TinyReader final : public FileReader {
   public:
-    std::expected<std::optional<FileRecords>, std::string> read(int, int, KSDate,
-                                                                LocationSink&) override {
+    std::expected<std::optional<FileRecords>, std::string> read(int, int, const ReaderContext&,
+                                                                LocationSink&,
+                                                                PeopleSink&) override {
         FileRecords records;
         ++count_;
         records.photos.push_back({.taken = {count_ * 600.0},

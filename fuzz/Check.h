@@ -14,7 +14,7 @@
 
 namespace keepsakes {
 
-inline constexpr ReaderContext kFuzzNow{KSDate{745000000}};
+inline const ReaderContext kFuzzNow{KSDate{745000000}};
 
 /// Ends the run, keeping the input, when a property does not hold.
 inline void check(bool holds, const char* property) {

@@ -31,11 +31,13 @@ toml_strings() {
     done
 }
 
-# newest_record INDEX: the end of the newest workout, photo occasion or visit, in seconds since 2001.
+# newest_record INDEX: the end of the newest workout, photo occasion, visit, message or call, in
+# seconds since 2001.
 newest_record() {
     sqlite3 -readonly "$1" "SELECT max(moment) FROM (SELECT max(end) AS moment FROM workouts
                             UNION ALL SELECT max(end) FROM occasions
-                            UNION ALL SELECT max(end) FROM visits WHERE place IS NOT NULL)"
+                            UNION ALL SELECT max(end) FROM visits WHERE place IS NOT NULL
+                            UNION ALL SELECT max(end) FROM interactions)"
 }
 
 # records_by_week INDEX: "2024, week 24: 5 2 12" for the eight newest weeks with records.
@@ -70,18 +72,23 @@ if [ "$stage" = start ]; then
         tracks=("$PWD/data/sample/tracks")
         photos=("$PWD/data/sample/photos")
         places=("$PWD/data/sample/places")
+        messages=("$PWD/data/sample/messages")
+        contacts=("$PWD/data/sample/contacts")
         export TZ=Europe/Vienna
         now=2024-06-16T20:00:00+02:00
     else
         tracks=("${folders[@]}")
         photos=("${folders[@]}")
         places=()
+        messages=("${folders[@]}")
+        contacts=("${folders[@]}")
         echo "reading ${folders[*]}"
         "$bin/keepsakes-indexer" --index "$home/look.sqlite" --tracks "${tracks[@]}" \
-            --photos "${photos[@]}" --human
+            --photos "${photos[@]}" --messages "${messages[@]}" \
+            --contacts "${contacts[@]}" --human
         newest=$(newest_record "$home/look.sqlite")
         if [ -z "$newest" ]; then
-            echo "There is no workout, photo occasion or visit in these folders, so there is" \
+            echo "There is no workout, photo occasion, visit or message in these folders, so there is" \
                  "nothing to suggest. The lines above say which files were passed over and why."
             exit 1
         fi
@@ -98,14 +105,16 @@ if [ "$stage" = start ]; then
     track_folders=$(toml_strings "${tracks[@]}")
     photo_folders=$(toml_strings "${photos[@]}")
     place_folders=$(toml_strings ${places[@]+"${places[@]}"})
+    message_folders=$(toml_strings "${messages[@]}")
+    contact_folders=$(toml_strings "${contacts[@]}")
     mkdir -p "$XDG_CONFIG_HOME/keepsakesd"
     cat >"$XDG_CONFIG_HOME/keepsakesd/config.toml" <<EOF
 [device_data]
 tracks    = [$track_folders]
 photos    = [$photo_folders]
 calendars = []
-messages  = []
-contacts  = []
+messages  = [$message_folders]
+contacts  = [$contact_folders]
 places    = [$place_folders]
 media     = false           # no player is on this bus
 [activities]                # nothing runs but what this script asks for

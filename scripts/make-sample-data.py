@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""Makes data/sample: the tracks, places and photos of an invented week that ends on Sunday, 2024-06-16.
+"""Makes data/sample: the tracks, places, photos, messages and contacts of an invented week that
+ends on Sunday, 2024-06-16.
 
 Needs the exiv2 command line tool. The same call makes the same bytes.
 
@@ -15,6 +16,8 @@ The owner lives in Graz (Europe/Vienna, UTC+2 that week):
              home, work, the inn and the hall are waypoints of the owner's
   Saturday   a hike (GPX), with photos
 and what she listened to that week, as records of the now-playing stream (CSV);
+and, in the weeks before and during that one, text messages and calls with Anna Beispiel (an Android
+backup), mails with Jakob Muster (a Maildir), a newsletter, and an address book that knows both;
 and two files that cannot be read: a GPX file cut in the middle, a photo without a date.
 """
 
@@ -368,6 +371,111 @@ def make_plays(folder):
                                  player])
 
 
+# People
+
+ANNA = "+436605551234"
+OWNER = "ich@example.org"
+JAKOB = "jakob.muster@example.org"
+
+CARDS = """BEGIN:VCARD
+VERSION:3.0
+UID:anna-beispiel
+FN:Anna Beispiel
+N:Beispiel;Anna;;;
+TEL;TYPE=CELL:+43 660 555 12 34
+EMAIL;TYPE=HOME:anna@example.org
+BDAY:1991-06-14
+END:VCARD
+BEGIN:VCARD
+VERSION:4.0
+UID:urn:uuid:4fbe8971-0bc3-424c-9c26-36c3e1eff6b1
+FN:Jakob Muster
+TEL;VALUE=uri;TYPE="voice,cell":tel:+43-676-555-98-76
+EMAIL:jakob.muster@example.org
+GEO:geo:47.0707,15.4395
+END:VCARD
+BEGIN:VCARD
+VERSION:2.1
+N;CHARSET=UTF-8;ENCODING=QUOTED-PRINTABLE:Gr=C3=BCn;Gro=C3=9Fmutter
+TEL;HOME:0316/55512
+END:VCARD
+"""
+
+# local time, 1 received or 2 sent
+TEXTS = [
+    ("2024-05-24 18:02:11", 1), ("2024-05-24 18:05:40", 2), ("2024-05-31 09:12:00", 2),
+    ("2024-05-31 09:30:27", 1), ("2024-06-05 20:14:02", 1), ("2024-06-05 20:15:33", 2),
+    ("2024-06-09 12:40:18", 2), ("2024-06-09 12:58:51", 1), ("2024-06-12 21:03:09", 1),
+    ("2024-06-12 21:10:44", 2), ("2024-06-14 07:58:30", 2), ("2024-06-14 08:20:05", 1),
+    ("2024-06-15 07:31:00", 1), ("2024-06-15 07:33:26", 2), ("2024-06-15 19:47:12", 1),
+    ("2024-06-15 19:52:39", 2),
+]
+
+# local time, seconds, 1 incoming, 2 outgoing or 3 missed
+CALLS = [("2024-06-08 17:20:00", 611, 2), ("2024-06-14 18:40:10", 0, 3),
+         ("2024-06-14 18:42:00", 184, 2)]
+
+# local time, whether it is from the owner, subject
+MAILS = [
+    ("2024-05-28 19:10:00", False, "Huettenabend"), ("2024-05-28 21:02:00", True, "Re: Huettenabend"),
+    ("2024-06-03 08:15:00", False, "Tourenbericht"), ("2024-06-03 12:20:00", True, "Re: Tourenbericht"),
+    ("2024-06-07 07:45:00", False, "Wetter"), ("2024-06-07 08:02:00", True, "Re: Wetter"),
+    ("2024-06-10 20:05:00", True, "Samstag"), ("2024-06-10 20:41:00", False, "Re: Samstag"),
+    ("2024-06-13 22:00:00", True, "Treffpunkt"), ("2024-06-13 22:17:00", False, "Re: Treffpunkt"),
+]
+
+
+def milliseconds(local):
+    return int((utc(local) - LOCAL_OFFSET - datetime(1970, 1, 1)).total_seconds()) * 1000
+
+
+def android_backup(root, entries):
+    lines = ["<?xml version='1.0' encoding='UTF-8' standalone='yes' ?>",
+             f'<{root} count="{len(entries)}">', *entries, f"</{root}>", ""]
+    return "\n".join(lines)
+
+
+def make_messages(folder):
+    folder.mkdir(parents=True, exist_ok=True)
+    texts = [
+        f'  <sms protocol="0" address="{ANNA}" date="{milliseconds(local)}" type="{kind}"'
+        f' subject="null" body="Nachricht {number}" read="1" status="-1"'
+        f' contact_name="Anna Beispiel" />'
+        for number, (local, kind) in enumerate(TEXTS, start=1)
+    ]
+    texts.append(f'  <sms protocol="0" address="Paketdienst" date="{milliseconds("2024-06-13 10:00:00")}"'
+                 ' type="1" subject="null" body="Ihr Paket" contact_name="(Unknown)" />')
+    (folder / "sms-20240616.xml").write_text(android_backup("smses", texts))
+    calls = [
+        f'  <call number="0660 555 12 34" duration="{seconds}" date="{milliseconds(local)}"'
+        f' type="{kind}" presentation="1" contact_name="Anna Beispiel" />'
+        for local, seconds, kind in CALLS
+    ]
+    (folder / "calls-20240616.xml").write_text(android_backup("calls", calls))
+    make_mails(folder / "Maildir")
+
+
+def make_mails(folder):
+    for name in ("cur", ".Sent/cur"):
+        (folder / name).mkdir(parents=True, exist_ok=True)
+    for number, (local, is_sent, subject) in enumerate(MAILS, start=1):
+        sender, recipient = (OWNER, JAKOB) if is_sent else (JAKOB, OWNER)
+        time = utc(local).strftime("%a, %d %b %Y %H:%M:%S +0200")
+        place = ".Sent/cur" if is_sent else "cur"
+        (folder / place / f"{number}.sample:2,S").write_text(
+            f"From: {sender}\nTo: {recipient}\nDate: {time}\nMessage-ID: <{number}@example.org>\n"
+            f"Subject: {subject}\n\nText {number}.\n")
+    (folder / "cur" / "99.sample:2,").write_text(
+        "From: Bergwetter <news@example.com>\nTo: ich@example.org\n"
+        "Date: Fri, 14 Jun 2024 06:00:00 +0000\nMessage-ID: <news-24@example.com>\n"
+        "List-Unsubscribe: <mailto:leave@example.com>\nSubject: Das Wochenende\n\nSonnig.\n")
+
+
+def make_contacts(folder):
+    folder.mkdir(parents=True, exist_ok=True)
+    (folder / "freunde.vcf").write_text(CARDS.replace("\n", "\r\n"), newline="")
+
+
 def main():
     beside = Path(__file__).resolve().parent.parent / "data" / "sample"
     folder = Path(sys.argv[1]) if len(sys.argv) > 1 else beside
@@ -375,6 +483,8 @@ def main():
     make_places(folder / "places")
     make_photos(folder / "photos")
     make_plays(folder / "media")
+    make_messages(folder / "messages")
+    make_contacts(folder / "contacts")
 
 
 if __name__ == "__main__":

@@ -11,6 +11,7 @@
 
 #include "core/Calendar.h"
 #include "core/Text.h"
+#include "model/ContactSummary.h"
 #include "model/KSEventBundle.h"
 #include "trends/TrendWords.h"
 #include "trends/TrendsKeys.h"
@@ -238,6 +239,7 @@ std::vector<std::string> titles(const KSEventBundle& bundle) {
             addDistinct(texts, mediaText(*event->mediaTitle, event->mediaArtist.value_or(""),
                                          event->mediaRepetitions.value_or(0)));
         }
+        addDistinct(texts, contactSummaryOf(*event).peopleText());
         addDistinct(texts, event->itemLinkTitle ? event->itemLinkTitle : event->itemDisplayName);
     }
     return texts;
@@ -303,6 +305,10 @@ PhotoFacts photoFacts(const KSEventBundle& bundle) {
 std::string promptLanguageOf(const KSEventBundle& bundle) {
     auto parts = titles(bundle);
     if (const auto span = mainSpan(bundle)) parts.push_back(timeText(*span));
+    for (const auto& event : bundle.events) {
+        const auto counts = contactSummaryOf(*event).countText();
+        if (!counts.empty()) parts.push_back(counts);
+    }
     if (const auto photos = photoFacts(bundle); photos.any) {
         parts.push_back(photosText(photos.count, photos.subject));
         if (!photos.people.empty()) parts.push_back(peopleText(photos.people));

@@ -14,6 +14,7 @@
 #include "core/Calendar.h"
 #include "core/Clock.h"
 #include "core/Json.h"
+#include "model/ContactSummary.h"
 
 namespace keepsakes {
 
@@ -86,6 +87,12 @@ std::string detailsOf(const KSEvent& event) {
         add(playedText(event.mediaRepetitions.value_or(0), *event.mediaSumTimePlayed));
     }
     add(event.itemDisplayName ? event.itemDisplayName : event.itemLinkTitle);
+    if (event.category() == KSEventCategory::significantContact) {
+        const auto contact = contactSummaryOf(event);
+        add(contact.peopleText());
+        add(contact.countText());
+        if (contact.score) add(fmt::format("score {:.2f}", *contact.score));
+    }
     if (const auto& photos = event.extendedAttributes) {
         for (const auto& word :
              photos->photoKeepsakeInferences.value_or(std::vector<std::string>())) {

@@ -6,6 +6,7 @@
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
+#include "sources/KSSignificantContactManager.h"
 #include "sources/KSVitalsManager.h"
 
 namespace keepsakes {
@@ -23,8 +24,9 @@ EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
       routineServiceManager_(universe.service<KSRoutineServiceManager>("RoutineServiceManager")),
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
-      nowPlayingMediaManager_(
-          universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")) {
+      nowPlayingMediaManager_(universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")),
+      significantContactManager_(
+          universe.service<KSSignificantContactManager>("SignificantContactManager")) {
     if (vitalsManager_) {
         steps_.push_back({"resultWorkoutsSuccess",
                           [source = vitalsManager_](KSDate start, KSDate end, ResultHandler done) {
@@ -53,6 +55,13 @@ EventSources::EventSources(const ServiceLookup& universe)
                  source->fetchAndSaveRepeatedMediaPlayBetweenStartDate(start, end, std::move(done));
              }});
     }
+    if (significantContactManager_) {
+        steps_.push_back(
+            {"resultContactsSuccess",
+             [source = significantContactManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveConversationsBetweenStartDate(start, end, std::move(done));
+             }});
+    }
 }
 
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
@@ -78,6 +87,12 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
         case KSEventCategory::leisureMedia:
             if (nowPlayingMediaManager_) {
                 nowPlayingMediaManager_->removeMediaPlayEventsDeletedAtSource(group, handler);
+                return;
+            }
+            break;
+        case KSEventCategory::significantContact:
+            if (significantContactManager_) {
+                significantContactManager_->removeConversationsDeletedAtSource(group, handler);
                 return;
             }
             break;
@@ -110,6 +125,12 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         case KSEventCategory::leisureMedia:
             if (nowPlayingMediaManager_) {
                 handler(nowPlayingMediaManager_->rehydratedMediaPlayEvents(group), std::nullopt);
+                return;
+            }
+            break;
+        case KSEventCategory::significantContact:
+            if (significantContactManager_) {
+                handler(significantContactManager_->rehydrateConversations(group), std::nullopt);
                 return;
             }
             break;

@@ -114,6 +114,28 @@ Setter biologicalSex(int& target) {
     };
 }
 
+Setter addresses(std::vector<std::string>& target) {
+    return [&target](const toml::node& value, const Surroundings&) -> OptionalProblem {
+        const auto* array = value.as_array();
+        if (!array) return problemAt(value, "must be an array of addresses");
+        std::vector<std::string> read;
+        for (const auto& item : *array) {
+            const auto text = item.value_exact<std::string>();
+            if (!text) return problemAt(item, "must hold strings only");
+            const bool isNumber = text->find_first_not_of("+-./() 0123456789") == text->npos &&
+                                  text->find_first_of("0123456789") != text->npos;
+            if (!isNumber && text->find('@') == text->npos) {
+                return problemAt(
+                    item,
+                    fmt::format("\"{}\" is neither an address nor a telephone number", *text));
+            }
+            read.push_back(*text);
+        }
+        target = std::move(read);
+        return std::nullopt;
+    };
+}
+
 struct Key {
     std::string_view section;
     std::string_view name;
@@ -134,6 +156,7 @@ std::vector<Key> keysOf(Configuration& to) {
         {"device_data", "media", boolean(to.deviceData.media)},
         {"owner", "date_of_birth", localDate(to.owner.dateOfBirth)},
         {"owner", "biological_sex", biologicalSex(to.owner.biologicalSex)},
+        {"owner", "addresses", addresses(to.owner.addresses)},
         {"device", "content_protection", boolean(to.device.contentProtection)},
         {"activities", "collection", period(to.activities.collection)},
         {"activities", "compute", period(to.activities.compute)},

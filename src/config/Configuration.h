@@ -44,6 +44,8 @@ struct Configuration {
     struct {
         std::optional<Day> dateOfBirth;
         int biologicalSex = 0;  ///< 0 not set, 1 female, 2 male, 3 other.
+        /// The owner's own mail addresses and telephone numbers, beside those that files tell.
+        std::vector<std::string> addresses;
     } owner;
 
     struct {

@@ -8,7 +8,9 @@
 #include "core/Log.h"
 #include "core/Problems.h"
 #include "daemon/MemoryRelease.h"
+#include "devicedata/IndexedContactStore.h"
 #include "devicedata/IndexedHealthStore.h"
+#include "devicedata/IndexedInteractionStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "devicedata/IndexedRoutineService.h"
 #include "devicedata/MediaStreamFile.h"
@@ -76,6 +78,9 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     options.photos = configuration.deviceData.photos;
     options.places = configuration.deviceData.places;
     options.gazetteer = configuration.deviceData.gazetteer;
+    options.messages = configuration.deviceData.messages;
+    options.contacts = configuration.deviceData.contacts;
+    options.ownerAddresses = configuration.owner.addresses;
     return options;
 }
 
@@ -119,6 +124,8 @@ struct DevicePorts::Adapters {
           health(folders.cache / kIndexFile, ownerFacts(configuration)),
           photos(folders.cache / kIndexFile),
           routine(folders.cache / kIndexFile, *clock),
+          interactions(folders.cache / kIndexFile),
+          contacts(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
@@ -142,6 +149,8 @@ struct DevicePorts::Adapters {
     IndexedHealthStore health;
     IndexedPhotoAnalysis photos;
     IndexedRoutineService routine;
+    IndexedInteractionStore interactions;
+    IndexedContactStore contacts;
     IndexerProcess deviceData;
     ActivityTimers activities;
     MediaStreamFile media;
@@ -164,6 +173,8 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.photoAnalysis = &adapters_->photos;
     services_.routineService = &adapters_->routine;
     services_.nowPlayingStream = &adapters_->media;
+    services_.interactionStore = &adapters_->interactions;
+    services_.contactStore = &adapters_->contacts;
     services_.deviceData = &adapters_->deviceData;
     services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;

@@ -24,6 +24,7 @@
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
+#include "sources/KSSignificantContactManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
 #include "store/KSEventStore.h"
@@ -56,6 +57,7 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("RoutineServiceManager", KSRoutineServiceManager::initWithUniverse(*this));
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
     add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
+    add("SignificantContactManager", KSSignificantContactManager::initWithUniverse(*this));
     add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));
     add("EventManager", KSEventManager::initWithUniverse(*this));
     const auto bundleManager = KSEventBundleManager::initWithUniverse(*this);

@@ -7,6 +7,8 @@ std::string_view indexSchema() {
     // Instants are seconds since 2001-01-01 UTC, positions degrees. Paths and names are bytes, for
     // nothing says that they are text. A file row stands in its folder's order, so that a rescan
     // reads a folder's rows in one sweep; records refer to it by its number, which a rename keeps.
+    // Lists of handles are their numbers with blanks between; those of an interaction are read far
+    // more often as a whole than searched.
     return R"sql(
 CREATE TABLE meta(key TEXT PRIMARY KEY, value) WITHOUT ROWID;
 CREATE TABLE folders(id INTEGER PRIMARY KEY, path BLOB NOT NULL UNIQUE);
@@ -22,9 +24,11 @@ CREATE TABLE files(
     hash BLOB,
     reason TEXT,
     refusedAt REAL,
+    mailbox INTEGER NOT NULL DEFAULT 0,
     PRIMARY KEY(folder, name)) WITHOUT ROWID;
 CREATE UNIQUE INDEX filesById ON files(id);
 CREATE INDEX filesRefused ON files(refusedAt) WHERE refusedAt IS NOT NULL;
+CREATE INDEX filesSent ON files(id) WHERE mailbox = 1;
 CREATE TABLE workouts(
     file INTEGER NOT NULL, start REAL NOT NULL, end REAL NOT NULL, type INTEGER NOT NULL);
 CREATE INDEX workoutsByEnd ON workouts(end);
@@ -107,6 +111,36 @@ CREATE TABLE gazetteer(
     reason TEXT);
 CREATE TABLE towns(latitude REAL NOT NULL, longitude REAL NOT NULL, name TEXT NOT NULL);
 CREATE INDEX townsByPosition ON towns(latitude, longitude, name);
+CREATE TABLE handles(
+    id INTEGER PRIMARY KEY,
+    handle TEXT NOT NULL UNIQUE,
+    person INTEGER,
+    owner INTEGER NOT NULL DEFAULT 0);
+CREATE TABLE interactions(
+    file INTEGER NOT NULL,
+    identity BLOB NOT NULL,
+    start REAL NOT NULL,
+    end REAL NOT NULL,
+    mechanism INTEGER NOT NULL,
+    direction INTEGER NOT NULL,
+    sender INTEGER,
+    recipients TEXT NOT NULL);
+CREATE INDEX interactionsByStart ON interactions(start);
+CREATE INDEX interactionsByFile ON interactions(file);
+CREATE TABLE cards(
+    file INTEGER NOT NULL,
+    uid TEXT NOT NULL,
+    name TEXT NOT NULL,
+    handles TEXT NOT NULL,
+    fromPhone INTEGER NOT NULL);
+CREATE INDEX cardsByFile ON cards(file);
+CREATE TABLE ownerHandles(file INTEGER NOT NULL, handle INTEGER NOT NULL);
+CREATE INDEX ownerHandlesByFile ON ownerHandles(file);
+CREATE TABLE people(
+    id INTEGER PRIMARY KEY,
+    identifier TEXT NOT NULL UNIQUE,
+    name TEXT NOT NULL,
+    score REAL NOT NULL);
 )sql";
 }
 

@@ -16,6 +16,10 @@ inline constexpr int kIndexBusyMilliseconds = 5000;
 inline constexpr std::string_view kMetaLastChanged = "lastChanged";  ///< Seconds since 2001.
 inline constexpr std::string_view kMetaOccasionsStale = "occasionsStale";
 inline constexpr std::string_view kMetaPlacesStale = "placesStale";
+inline constexpr std::string_view kMetaPeopleStale = "peopleStale";
+inline constexpr std::string_view kMetaPeopleRanked = "peopleRanked";  ///< Seconds since 2001.
+inline constexpr std::string_view kMetaPeopleOwner = "peopleOwner";    ///< A hash of addresses.
+inline constexpr std::string_view kMetaHandlesLoose = "handlesLoose";
 inline constexpr std::string_view kMetaNextFile = "nextFile";
 
 /// What a file of the index is known as (column "state").

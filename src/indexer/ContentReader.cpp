@@ -39,20 +39,67 @@ std::expected<FileRecords, std::string> readTracks(int fd, FileKind kind,
             return readLocationHistoryFile(fd, context, places);
         case FileKind::geoJson:
             return readGeoJsonFile(fd, context, places);
-        case FileKind::unknown:
-        case FileKind::photo:
+        default:
             break;
     }
     return FileRecords();
 }
 
-bool tellsOfPlaces(FileKind kind) { return kind != FileKind::unknown && kind != FileKind::photo; }
+bool tellsOfPlaces(FileKind kind) {
+    return kind == FileKind::track || kind == FileKind::fit || kind == FileKind::ownTracks ||
+           kind == FileKind::locationHistory || kind == FileKind::geoJson;
+}
+
+/// Hands the places of contacts on, too.
+class ContactPlaces final : public PeopleSink {
+  public:
+    ContactPlaces(PeopleSink& people, LocationSink& places) : people_(people), places_(places) {}
+    void interaction(const InteractionRecord& record) override { people_.interaction(record); }
+    void card(const ContactCard& card) override {
+        people_.card(card);
+        if (!card.position || card.name.empty()) return;
+        places_.place({.position = *card.position,
+                       .name = card.name,
+                       .use = PlaceUse::unknown,
+                       .origin = NamedPlace::Origin::contact});
+    }
+    void ownerHandle(const std::string& handle) override { people_.ownerHandle(handle); }
+
+  private:
+    PeopleSink& people_;
+    LocationSink& places_;
+};
+
+using Answer = std::expected<std::optional<FileRecords>, std::string>;
+
+/// Everything of such a file went to the sink.
+Answer streamed(const std::expected<void, std::string>& done) {
+    if (!done) return std::unexpected(done.error());
+    return FileRecords();
+}
+
+Answer readPeople(FileKind kind, int fd, const ReaderContext& context, PeopleSink& people) {
+    switch (kind) {
+        case FileKind::mail:
+            return streamed(readMailFile(fd, context, people));
+        case FileKind::mailbox:
+            return streamed(readMailboxFile(fd, context, people));
+        case FileKind::messageBackup:
+            return streamed(readMessageBackupFile(fd, context, people));
+        case FileKind::chatHistory: {
+            const auto isChattys = readChatHistoryFile(context, people);
+            if (!isChattys) return std::unexpected(isChattys.error());
+            return *isChattys ? std::optional(FileRecords()) : std::nullopt;
+        }
+        default:
+            return std::nullopt;
+    }
+}
 
 }  // namespace
 
-std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int fd, int wanted,
-                                                                           KSDate now,
-                                                                           LocationSink& places) {
+Answer ContentReader::read(int fd, int wanted, const ReaderContext& context, LocationSink& places,
+                           PeopleSink& people) {
     std::array<std::byte, kHeadSize> head{};
     std::size_t filled = 0;
     while (filled < head.size()) {
@@ -64,7 +111,6 @@ std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int f
         filled += static_cast<std::size_t>(count);
     }
     const auto kind = kindOf(std::span(head).first(filled));
-    const ReaderContext context{.now = now};
     if (tellsOfPlaces(kind) && (wanted & kWantsTracks) != 0) {
         return readTracks(fd, kind, context, places);
     }
@@ -77,6 +123,11 @@ std::expected<std::optional<FileRecords>, std::string> ContentReader::read(int f
     if (kind == FileKind::photo && (wanted & kWantsPhotos) != 0) {
         return readPhotoFile(fd, context);
     }
+    if (kind == FileKind::contacts && (wanted & kWantsContacts) != 0) {
+        ContactPlaces both(people, places);
+        return streamed(readContactFile(fd, context, both));
+    }
+    if ((wanted & kWantsMessages) != 0) return readPeople(kind, fd, context, people);
     return std::nullopt;
 }
 

@@ -8,8 +8,10 @@ namespace keepsakes {
 /// The reader of everything that folders are searched for, by the files' content.
 class ContentReader final : public FileReader {
   public:
-    std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted, KSDate now,
-                                                                LocationSink& places) override;
+    std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted,
+                                                                const ReaderContext& context,
+                                                                LocationSink& places,
+                                                                PeopleSink& people) override;
 };
 
 }  // namespace keepsakes

@@ -16,6 +16,8 @@ namespace keepsakes {
 
 namespace {
 
+constexpr std::string_view kLogSuffix = "-wal";
+
 FileStamp stampOf(const struct stat& info) {
     return {.size = info.st_size,
             .mtime = std::int64_t{info.st_mtim.tv_sec} * 1'000'000'000 + info.st_mtim.tv_nsec,
@@ -36,6 +38,40 @@ std::size_t characterLength(std::string_view text) {
     const bool isOverlong = (first == 0xe0 && second < 0xa0) || (first == 0xf0 && second < 0x90);
     const bool isOutside = (first == 0xed && second > 0x9f) || (first == 0xf4 && second > 0x8f);
     return isOverlong || isOutside ? 0 : length;
+}
+
+FileStamp joined(FileStamp stamp, const FileStamp& log) {
+    return {.size = stamp.size + log.size,
+            .mtime = std::max(stamp.mtime, log.mtime),
+            .inode = stamp.inode};
+}
+
+/// Takes away what databases keep beside themselves; their logs go into their stamps.
+void joinLogs(std::vector<ListedFile>& files) {
+    const auto isBesideName = [](const ListedFile& file) {
+        return file.name.ends_with(kLogSuffix) || file.name.ends_with("-shm") ||
+               file.name.ends_with("-journal");
+    };
+    if (std::ranges::none_of(files, isBesideName)) return;
+    const auto mainFile = [&files](std::string_view name) -> ListedFile* {
+        for (const std::string_view end :
+             {kLogSuffix, std::string_view("-shm"), std::string_view("-journal")}) {
+            if (!name.ends_with(end)) continue;
+            const auto main = name.substr(0, name.size() - end.size());
+            const auto found = std::ranges::lower_bound(files, main, {}, &ListedFile::name);
+            return found != files.end() && found->name == main ? &*found : nullptr;
+        }
+        return nullptr;
+    };
+    for (const auto& file : files) {
+        if (!file.name.ends_with(kLogSuffix)) continue;
+        if (auto* main = mainFile(file.name)) main->stamp = joined(main->stamp, file.stamp);
+    }
+    std::vector<ListedFile> kept;
+    for (const auto& file : files) {
+        if (!isBesideName(file) || !mainFile(file.name)) kept.push_back(file);
+    }
+    files = std::move(kept);
 }
 
 }  // namespace
@@ -76,7 +112,19 @@ std::expected<FolderListing, int> listFolder(const std::string& path) {
     }
     std::ranges::sort(listing.files, {}, &ListedFile::name);
     std::ranges::sort(listing.folders);
+    joinLogs(listing.files);
+    const auto has = [&listing](std::string_view name) {
+        return std::ranges::binary_search(listing.folders, name);
+    };
+    if (has("cur") && has("new")) std::erase(listing.folders, "tmp");
     return listing;
+}
+
+FileStamp withLog(const std::string& path, FileStamp stamp) {
+    struct stat info {};
+    const auto log = path + std::string(kLogSuffix);
+    if (::lstat(log.c_str(), &info) != 0 || !S_ISREG(info.st_mode)) return stamp;
+    return joined(stamp, stampOf(info));
 }
 
 bool isPassedOver(std::string_view name) {

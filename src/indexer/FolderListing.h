@@ -18,7 +18,8 @@ struct ListedFile {
 };
 
 /// One folder's regular files and folders, each by name. Links, pipes, sockets and devices are
-/// passed over, and so are the names that syncing tools and trash cans leave: `isPassedOver`.
+/// passed over, and so are the names that syncing tools and trash cans leave (`isPassedOver`) and
+/// the folder of a Maildir in which mails are still being written.
 struct FolderListing {
     std::vector<ListedFile> files;
     std::vector<std::string> folders;
@@ -27,6 +28,11 @@ struct FolderListing {
 
 /// Fails with an errno. A file that vanishes meanwhile is not in the list.
 std::expected<FolderListing, int> listFolder(const std::string& path);
+
+/// The stamp of a file together with the log that a database keeps beside it ("<name>-wal"): what
+/// changes a live database is its log. `listFolder` gives such stamps, and lists neither logs nor
+/// their indexes and journals as files of their own.
+FileStamp withLog(const std::string& path, FileStamp stamp);
 
 /// Unfinished downloads, deleted files kept for a while, old versions, thumbnails.
 bool isPassedOver(std::string_view name);

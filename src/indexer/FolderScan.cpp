@@ -21,6 +21,8 @@
 #include "indexer/LocationWriter.h"
 #include "indexer/OccasionUpdate.h"
 #include "indexer/OpenFile.h"
+#include "indexer/PeopleRows.h"
+#include "indexer/PeopleUpdate.h"
 #include "indexer/PlaceUpdate.h"
 #include "indexer/VisitUpdate.h"
 
@@ -34,24 +36,31 @@ using Steady = std::chrono::steady_clock;
 /// permissions may change without the file's doing so.
 constexpr std::int64_t kTryAgain = -1;
 
+/// After so many bytes a reader gives a sign of going on.
+constexpr std::uint64_t kBytesPerSign = std::uint64_t{1} << 20U;
+
 double secondsSince(Steady::time_point then) {
     return std::chrono::duration<double>(Steady::now() - then).count();
 }
 
-/// Whether the owner would take a file of this name for a track or a photo, so that its content's
-/// being neither is worth a word. What a file is, its content tells.
+/// Whether the owner would take a file of this name for one of those that are searched for, so that
+/// its content's being none is worth a word. What a file is, its content tells.
 bool promises(std::string_view name, int wanted) {
     static constexpr std::array<std::string_view, 5> kTracks{".gpx", ".tcx", ".fit", ".rec",
                                                              ".geojson"};
+    static constexpr std::array<std::string_view, 2> kMessages{".eml", ".mbox"};
+    static constexpr std::array<std::string_view, 1> kContacts{".vcf"};
     static constexpr std::array<std::string_view, 5> kPhotos{".jpg", ".jpeg", ".png", ".heic",
                                                              ".heif"};
     const auto dot = name.rfind('.');
     if (dot == std::string_view::npos) return false;
     std::string extension(name.substr(dot));
     for (char& c : extension) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-    return ((wanted & (kWantsTracks | kWantsPlaces)) != 0 &&
-            std::ranges::find(kTracks, extension) != kTracks.end()) ||
-           ((wanted & kWantsPhotos) != 0 && std::ranges::find(kPhotos, extension) != kPhotos.end());
+    const auto promised = [wanted, &extension](int kind, const auto& extensions) {
+        return (wanted & kind) != 0 && std::ranges::find(extensions, extension) != extensions.end();
+    };
+    return promised(kWantsTracks | kWantsPlaces, kTracks) || promised(kWantsPhotos, kPhotos) ||
+           promised(kWantsMessages, kMessages) || promised(kWantsContacts, kContacts);
 }
 
 struct Refusal {
@@ -76,7 +85,8 @@ class Scan {
           mark_(mark),
           reporter_(reporter),
           index_(options.index),
-          locations_(index_, [this] { tell(read_, changes_.changed.size()); }) {}
+          locations_(index_, [this] { tell(done_, total_); }),
+          people_(index_) {}
 
     void run() {
         changes_ = compareFolders(index_, searchedFolders(), [this] { tell(0, 0); });
@@ -88,6 +98,7 @@ class Scan {
         formRecords();
         readChanged();
         formRecords();
+        findPeople();
         if (summary_.changed) {
             index_.removeEmptyFolders();
             commit();
@@ -112,6 +123,13 @@ class Scan {
         for (const auto& path : options_.tracks) add(path, kWantsTracks);
         for (const auto& path : options_.photos) add(path, kWantsPhotos);
         for (const auto& path : options_.places) add(path, kWantsPlaces);
+        for (const auto& path : options_.messages) add(path, kWantsMessages);
+        for (const auto& path : options_.contacts) add(path, kWantsContacts);
+        for (auto& folder : folders) {
+            folder.mayBeMissing = std::ranges::any_of(
+                options_.standardFolders,
+                [&folder](const auto& standard) { return standard == folder.path; });
+        }
         return folders;
     }
 
@@ -147,9 +165,26 @@ class Scan {
         mark_.end();
     }
 
+    /// Vanished files by their size.
+    using BySize = std::unordered_multimap<std::int64_t, std::size_t>;
+
+    /// A renamed file, such as a mail that was read, has the stamp that it had; it need not even be
+    /// opened.
+    bool moveSameFile(const ChangedFile& file, BySize& bySize) {
+        const auto [first, last] = bySize.equal_range(file.stamp.size);
+        const auto same = std::find_if(first, last, [this, &file](const auto& entry) {
+            const auto& known = changes_.vanished[entry.second].file;
+            return known.stamp == file.stamp && known.wanted == file.wanted;
+        });
+        if (same == last) return false;
+        move(changes_.vanished[same->second], file);
+        bySize.erase(same);
+        return true;
+    }
+
     /// Gives a changed path the records of a vanished file of the same content.
     void moveRenamed() {
-        std::unordered_multimap<std::int64_t, std::size_t> bySize;
+        BySize bySize;
         for (std::size_t i = 0; i < changes_.vanished.size(); ++i) {
             const auto& file = changes_.vanished[i].file;
             if (!file.hash.empty()) bySize.emplace(file.stamp.size, i);
@@ -157,13 +192,14 @@ class Scan {
         if (bySize.empty()) return;
         std::erase_if(changes_.changed, [this, &bySize](const ChangedFile& file) {
             if (!bySize.contains(file.stamp.size)) return false;
+            if (moveSameFile(file, bySize)) return true;
             const auto path = pathOf(file);
             mark_.begin(path, file.stamp);
             const OpenFile open(path);
             const auto stamp = open.stamp();
             const auto hash = stamp ? contentHash(open.get(), stamp->size) : std::nullopt;
             mark_.end();
-            if (!hash || stamp != file.stamp) return false;
+            if (!hash || withLog(path, *stamp) != file.stamp) return false;
             const auto [first, last] = bySize.equal_range(stamp->size);
             const auto same = std::find_if(first, last, [this, &hash, &file](const auto& entry) {
                 const auto& known = changes_.vanished[entry.second].file;
@@ -180,6 +216,10 @@ class Scan {
         if (to.knownId != 0) index_.removeRecords(to.knownId);
         index_.removeFile(from.folder, from.name);
         from.file.stamp = to.stamp;
+        const auto mailbox = mailboxRole(pathOf(to));
+        if (mailbox != std::exchange(from.file.mailbox, mailbox)) {
+            index_.setMeta(kMetaPeopleStale, 1);
+        }
         index_.putFile(index_.folderId(changes_.folders[to.folder]), to.name, from.file);
         from.file.id = 0;  // Gone on under its new name.
         ++summary_.renamed;
@@ -207,8 +247,9 @@ class Scan {
         auto& files = changes_.changed;
         std::ranges::stable_sort(files, std::ranges::greater{},
                                  [](const ChangedFile& file) { return file.stamp.mtime; });
+        for (const auto& file : files) total_ += signsOf(file);
         for (auto& file : files) {
-            tell(read_, files.size());
+            tell(done_, total_);
             if (file.knownId == 0) file.knownId = index_.newFileId();
             const auto outcome = read(file);
             if (outcome.isGone) {
@@ -216,12 +257,13 @@ class Scan {
             } else {
                 store(file, outcome, FileState::refused);
             }
-            read_ = ++summary_.read;
+            ++summary_.read;
+            done_ += signsOf(file);
             if (secondsSince(formed_) > kSecondsPerForming) formRecords();
         }
         if (!files.empty()) {
             told_ = {};
-            tell(files.size(), files.size());
+            tell(total_, total_);
         }
     }
 
@@ -231,7 +273,7 @@ class Scan {
         mark_.begin(path, file.stamp);
         const OpenFile open(path);
         if (const auto stamp = open.stamp()) {
-            outcome.stamp = *stamp;
+            outcome.stamp = withLog(path, *stamp);
             readOpen(open.get(), file, outcome);
         } else if (open.error() == 0 || open.error() == ENOENT || open.error() == ELOOP ||
                    open.error() == ENOTDIR) {
@@ -247,9 +289,10 @@ class Scan {
 
     void readOpen(int fd, const ChangedFile& file, ReadOutcome& outcome) {
         locations_.begin(file.knownId);
+        people_.begin(file.knownId);
         try {
             outcome.hash = contentHash(fd, outcome.stamp.size).value_or("");
-            auto records = reader_.read(fd, file.wanted, options_.latest, locations_);
+            auto records = reader_.read(fd, file.wanted, contextOf(file), locations_, people_);
             if (!records) {
                 outcome.refusal = {RefusalReason::damaged, std::move(records.error())};
             } else if (*records) {
@@ -265,6 +308,21 @@ class Scan {
         }
         // As `begin` outside: what goes wrong with the index is not the file's fault.
         locations_.finish();
+        people_.finish();
+        if (!outcome.records) people_.drop();
+    }
+
+    /// A large file's reader tells how far it is, so that neither its time runs out nor the daemon
+    /// takes the scan for dead.
+    ReaderContext contextOf(const ChangedFile& file) {
+        return {.now = options_.latest,
+                .path = pathOf(file),
+                .progress = [this, told = std::uint64_t{0}](std::uint64_t bytes) mutable {
+                    if (bytes < told + kBytesPerSign) return;
+                    told = bytes;
+                    mark_.goOn();
+                    tell(done_ + bytes / kBytesPerSign, total_);
+                }};
     }
 
     void store(const ChangedFile& file, const ReadOutcome& outcome, FileState refusedState) {
@@ -272,6 +330,7 @@ class Scan {
                         .stamp = outcome.stamp,
                         .wanted = file.wanted,
                         .state = outcome.records ? FileState::read : FileState::foreign,
+                        .mailbox = mailboxRole(pathOf(file)),
                         .hash = outcome.hash,
                         .reason = std::nullopt,
                         .refusedAt = options_.now};
@@ -318,11 +377,23 @@ class Scan {
             updateOccasions(index_);
             summary_.changed = true;
         }
-        if (updateVisits(index_, options_.now, [this] { tell(read_, changes_.changed.size()); })) {
+        if (updateVisits(index_, options_.now, [this] { tell(done_, total_); })) {
             summary_.changed = true;
         }
         if (updatePlaces(index_)) summary_.changed = true;
         commit();
+    }
+
+    void findPeople() {
+        if (!updatePeople(index_, options_.ownerAddresses, options_.now)) return;
+        summary_.changed = true;
+        commit();
+    }
+
+    /// Steps of progress that a file counts as: one, and more for a large one that is read whole.
+    static std::uint64_t signsOf(const ChangedFile& file) {
+        const bool isReadWhole = (file.wanted & (kWantsMessages | kWantsContacts)) != 0;
+        return 1 + (isReadWhole ? static_cast<std::uint64_t>(file.stamp.size) / kBytesPerSign : 0);
     }
 
     void reportAll() {
@@ -345,9 +416,11 @@ class Scan {
     ScanReporter& reporter_;
     IndexWriter index_;
     LocationWriter locations_;
+    PeopleRows people_;
     FolderChanges changes_;
+    std::uint64_t done_ = 0;
+    std::uint64_t total_ = 0;
     ScanSummary summary_;
-    std::uint64_t read_ = 0;
     std::size_t uncommitted_ = 0;
     Steady::time_point committed_ = Steady::now();
     Steady::time_point formed_ = Steady::now();

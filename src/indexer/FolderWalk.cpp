@@ -34,7 +34,10 @@ class Walk {
             }
         }
         for (auto& root : searched) {
-            pending_.push_back({.path = std::move(root.path), .wanted = root.wanted, .depth = 0});
+            pending_.push_back({.path = std::move(root.path),
+                                .wanted = root.wanted,
+                                .depth = 0,
+                                .mayBeMissing = root.mayBeMissing});
             while (!pending_.empty()) {
                 const auto next = std::move(pending_.back());
                 pending_.pop_back();
@@ -50,6 +53,7 @@ class Walk {
         std::string path;
         int wanted;
         std::size_t depth;
+        bool mayBeMissing = false;
     };
 
     void visit(const Pending& folder) {
@@ -58,6 +62,7 @@ class Walk {
         if (!listing) {
             // Inside a folder that was just listed, "not there" means deleted.
             if (listing.error() == ENOENT && folder.depth > 0) return;
+            if (listing.error() == ENOENT && folder.mayBeMissing && !isKnown(folder.path)) return;
             keep(folder.path, std::generic_category().message(listing.error()));
             return;
         }
@@ -123,10 +128,19 @@ class Walk {
         for (; there != listing.files.end(); ++there) add(*there, nullptr);
     }
 
+    static bool isWithin(const std::string& path, const std::string& above) {
+        return path == above || (path.starts_with(above) && path[above.size()] == '/');
+    }
+
     bool isKept(const std::string& path) const {
-        return std::ranges::any_of(kept_, [&path](const std::string& above) {
-            return path == above || (path.starts_with(above) && path[above.size()] == '/');
-        });
+        return std::ranges::any_of(
+            kept_, [&path](const std::string& above) { return isWithin(path, above); });
+    }
+
+    /// Whether the index holds files of the folder.
+    bool isKnown(const std::string& above) const {
+        return std::ranges::any_of(
+            unvisited_, [&above](const auto& folder) { return isWithin(folder.first, above); });
     }
 
     void collectUnvisited() {

@@ -42,6 +42,7 @@ struct FolderChanges {
 struct SearchedFolder {
     std::string path;
     int wanted;
+    bool mayBeMissing = false;  ///< That there is none is no problem, unless there was one.
 };
 
 /// Walks the folders and compares what is there with what the index knows, a folder at a time.

@@ -88,7 +88,8 @@ std::unordered_map<std::string, std::int64_t> IndexWriter::folders() {
 void IndexWriter::forEachFile(std::int64_t folder,
                               const std::function<void(std::string&&, IndexedFile&&)>& visit) {
     auto& query = statement(
-        "SELECT name, id, size, mtime, inode, wanted, state, hash, reason, refusedAt FROM files"
+        "SELECT name, id, size, mtime, inode, wanted, state, hash, reason, refusedAt,"
+        " mailbox FROM files"
         " WHERE folder = ? ORDER BY name");
     query.bind(1, folder);
     while (query.executeStep()) {
@@ -98,6 +99,7 @@ void IndexWriter::forEachFile(std::int64_t folder,
                                    .inode = query.getColumn(4).getInt64()},
                          .wanted = query.getColumn(5).getInt(),
                          .state = static_cast<FileState>(query.getColumn(6).getInt()),
+                         .mailbox = static_cast<MailboxRole>(query.getColumn(10).getInt()),
                          .hash = query.getColumn(7).getString(),
                          .reason = std::nullopt,
                          .refusedAt = {}};
@@ -125,7 +127,9 @@ IndexWriter::Totals IndexWriter::totals() {
             .photos = count("SELECT count(*) FROM photos"),
             .occasions = count("SELECT count(*) FROM occasions"),
             .visits = count("SELECT count(*) FROM visits WHERE place IS NOT NULL"),
-            .places = count("SELECT count(*) FROM places")};
+            .places = count("SELECT count(*) FROM places"),
+            .interactions = count("SELECT count(*) FROM interactions"),
+            .people = count("SELECT count(*) FROM people")};
 }
 
 std::vector<RefusedFile> IndexWriter::refusedFiles(std::size_t most) {
@@ -166,7 +170,7 @@ void IndexWriter::putFile(std::int64_t folder, const std::string& name, const In
     begin();
     auto& put = statement(
         "INSERT OR REPLACE INTO files(folder, name, id, size, mtime, inode, wanted, state, hash,"
-        " reason, refusedAt) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
+        " reason, refusedAt, mailbox) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
     put.clearBindings();
     put.bind(1, folder);
     bindBytes(put, 2, name);
@@ -181,6 +185,7 @@ void IndexWriter::putFile(std::int64_t folder, const std::string& name, const In
         put.bind(10, printable(*file.reason));
         put.bind(11, file.refusedAt.seconds);
     }
+    put.bind(12, static_cast<int>(file.mailbox));
     put.exec();
 }
 
@@ -258,7 +263,21 @@ void IndexWriter::putRecords(std::int64_t file, const FileRecords& records) {
 
 void IndexWriter::removeRecords(std::int64_t file) {
     removeLocations(file);
+    removePeople(file);
     removeOtherRecords(file);
+}
+
+void IndexWriter::removePeople(std::int64_t file) {
+    begin();
+    for (const char* text :
+         {"DELETE FROM interactions WHERE file = ?", "DELETE FROM cards WHERE file = ?",
+          "DELETE FROM ownerHandles WHERE file = ?"}) {
+        auto& remove = statement(text);
+        remove.bind(1, file);
+        if (remove.exec() == 0) continue;
+        setMeta(kMetaPeopleStale, 1);
+        setMeta(kMetaHandlesLoose, 1);
+    }
 }
 
 void IndexWriter::removeOtherRecords(std::int64_t file) {

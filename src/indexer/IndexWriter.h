@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "devicedata/IndexSchema.h"
+#include "devicedata/MailboxRole.h"
 #include "indexer/ReadMark.h"
 #include "readers/FileRecords.h"
 #include "readers/LocationRecords.h"
@@ -25,6 +26,7 @@ struct IndexedFile {
     FileStamp stamp;
     int wanted = 0;  ///< What its folder was searched for.
     FileState state = FileState::read;
+    MailboxRole mailbox = MailboxRole::other;
     std::string hash;                   ///< Empty when the file could not be read.
     std::optional<std::string> reason;  ///< Why it is passed over.
     KSDate refusedAt;                   ///< Since when; only beside a reason.
@@ -62,6 +64,8 @@ class IndexWriter {
         std::uint64_t occasions = 0;
         std::uint64_t visits = 0;
         std::uint64_t places = 0;  ///< Locations of interest.
+        std::uint64_t interactions = 0;
+        std::uint64_t people = 0;
     };
     Totals totals();
 
@@ -80,10 +84,13 @@ class IndexWriter {
 
     /// Replaces the records of a file. Photos stay in their occasions by their number in the file,
     /// until occasions are formed anew. Records with numbers that are no times are left out. What
-    /// the file tells of places stays.
+    /// the file tells of places and people stays.
     void putRecords(std::int64_t file, const FileRecords& records);
-    /// All that the file told, also of places.
+    /// All that the file told, also of places and people.
     void removeRecords(std::int64_t file);
+
+    /// What the file told of people; `PeopleRows` writes that.
+    void removePeople(std::int64_t file);
 
     // What a file tells of places, and the days whose visits are to be found anew.
 
@@ -105,8 +112,10 @@ class IndexWriter {
 
     SQLite::Database& database() { return database_; }
 
-  private:
+    /// Begins what `commit` makes last; for changes made through `database`.
     void begin();
+
+  private:
     void removeOtherRecords(std::int64_t file);
 
     SQLite::Database database_;

@@ -31,11 +31,14 @@ constexpr int kBusy = 3;
 constexpr const char* kHelp =
     "usage: keepsakes-indexer [--config FILE] [--index FILE] [--tracks FOLDER...]\n"
     "                         [--photos FOLDER...] [--places FOLDER...] [--gazetteer FILE]\n"
-    "                         [--now SECONDS] [--seconds-per-file N] [--json | --human]\n"
+    "                         [--messages FOLDER...] [--contacts FOLDER...]\n"
+    "                         [--owner ADDRESS...] [--now SECONDS] [--seconds-per-file N]\n"
+    "                         [--json | --human]\n"
     "Scans the folders once and brings the index up to date.\n"
     "  --config   whose folders to scan when none are given; otherwise the daemon's\n"
     "  --index    the index; otherwise the daemon's, in the user's cache folder\n"
     "  --gazetteer  a table of towns in the format of GeoNames, to call places by\n"
+    "  --owner    mail addresses and telephone numbers of the owner\n"
     "  --now      the time to take for now, in seconds since 2001-01-01 UTC\n"
     "  --json     one JSON object a line on standard output\n"
     "  --human    sentences for people; the default on a terminal\n";
@@ -57,7 +60,8 @@ KSDate systemNow() {
 /// user's cache folder. Why that cannot be done, or nothing.
 std::optional<std::string> complete(Arguments& arguments) {
     auto& scan = arguments.scan;
-    const bool needsFolders = scan.tracks.empty() && scan.photos.empty() && scan.places.empty();
+    const bool needsFolders = scan.tracks.empty() && scan.photos.empty() && scan.places.empty() &&
+                              scan.messages.empty() && scan.contacts.empty();
     if (!needsFolders && !scan.index.empty()) return std::nullopt;
     const auto standard = StandardFolders::find();
     if (!standard) return standard.error().description();
@@ -71,6 +75,9 @@ std::optional<std::string> complete(Arguments& arguments) {
     scan.photos = configuration->deviceData.photos;
     scan.places = configuration->deviceData.places;
     if (scan.gazetteer.empty()) scan.gazetteer = configuration->deviceData.gazetteer;
+    scan.messages = configuration->deviceData.messages;
+    scan.contacts = configuration->deviceData.contacts;
+    if (scan.ownerAddresses.empty()) scan.ownerAddresses = configuration->owner.addresses;
     return std::nullopt;
 }
 
@@ -78,6 +85,16 @@ template <class T>
 bool parseNumber(std::string_view text, T& number) {
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
     return error == std::errc() && end == text.data() + text.size();
+}
+
+/// The list of folders that an option fills; null for another option.
+std::vector<std::filesystem::path>* foldersOf(std::string_view option, ScanOptions& scan) {
+    if (option == "--tracks") return &scan.tracks;
+    if (option == "--photos") return &scan.photos;
+    if (option == "--places") return &scan.places;
+    if (option == "--messages") return &scan.messages;
+    if (option == "--contacts") return &scan.contacts;
+    return nullptr;
 }
 
 /// Why the arguments cannot be taken, or nothing.
@@ -89,11 +106,12 @@ std::optional<std::string> parse(std::span<char*> words, Arguments& arguments) {
     };
     while (i < words.size()) {
         const std::string_view option(words[i++]);
-        if (option == "--tracks" || option == "--photos" || option == "--places") {
-            auto& folders = option == "--tracks"   ? arguments.scan.tracks
-                            : option == "--photos" ? arguments.scan.photos
-                                                   : arguments.scan.places;
-            while (i < words.size() && !isOption(words[i])) folders.emplace_back(words[i++]);
+        if (auto* folders = foldersOf(option, arguments.scan)) {
+            while (i < words.size() && !isOption(words[i])) folders->emplace_back(words[i++]);
+        } else if (option == "--owner") {
+            while (i < words.size() && !isOption(words[i])) {
+                arguments.scan.ownerAddresses.emplace_back(words[i++]);
+            }
         } else if (option == "--index") {
             const auto path = value();
             if (!path) return "--index needs a file";
@@ -141,11 +159,19 @@ int scan(const Arguments& arguments, FileReader& reader) {
         logError(mark.error());
         return kBusy;
     }
+    const auto standard = defaultConfiguration().deviceData;
+    for (const auto& folders :
+         {standard.tracks, standard.photos, standard.messages, standard.contacts}) {
+        options.standardFolders.insert(options.standardFolders.end(), folders.begin(),
+                                       folders.end());
+    }
     // Loads the owner's zone while its file can be read.
     calendar::offsetAt(options.now);
     auto readable = options.tracks;
-    readable.insert(readable.end(), options.photos.begin(), options.photos.end());
-    readable.insert(readable.end(), options.places.begin(), options.places.end());
+    for (const auto& folders :
+         {options.photos, options.places, options.messages, options.contacts}) {
+        readable.insert(readable.end(), folders.begin(), folders.end());
+    }
     if (!options.gazetteer.empty()) {
         // The configured file may be a link; what it leads to is read.
         std::error_code ignored;

@@ -112,6 +112,9 @@ void ReadMark::begin(const std::string& path, const FileStamp& stamp) {
             static_cast<unsigned>(std::min(stamp.size / kBytesPerSecond, kMostSeconds)));
 }
 
+// NOLINTNEXTLINE(readability-make-member-function-const): it changes the process' alarm
+void ReadMark::goOn() { ::alarm(secondsPerFile_); }
+
 // NOLINTNEXTLINE(readability-make-member-function-const): it changes the file
 void ReadMark::end() {
     ::alarm(0);

@@ -49,6 +49,8 @@ class ReadMark {
     const std::optional<ReadMarkEntry>& leftBehind() const { return leftBehind_; }
 
     void begin(const std::string& path, const FileStamp& stamp);
+    /// The file is large and its reading goes on: its time begins anew.
+    void goOn();
     void end();
 
   private:

@@ -28,6 +28,8 @@ class JsonReporter final : public ScanReporter {
                                        {"occasions", summary.totals.occasions},
                                        {"visits", summary.totals.visits},
                                        {"places", summary.totals.places},
+                                       {"interactions", summary.totals.interactions},
+                                       {"people", summary.totals.people},
                                        {"read", summary.read},
                                        {"renamed", summary.renamed},
                                        {"removed", summary.removed},
@@ -60,10 +62,10 @@ class HumanReporter final : public ScanReporter {
         endProgress();
         const auto& totals = summary.totals;
         fmt::print(
-            "{} files known: {} workouts; {} visits to {} places; {} photos in {} "
-            "occasions; {} files refused.\n",
+            "{} files known: {} workouts; {} visits to {} places; {} photos in {} occasions; {} "
+            "messages and calls; {} people; {} files refused.\n",
             totals.files, totals.workouts, totals.visits, totals.places, totals.photos,
-            totals.occasions, totals.refused);
+            totals.occasions, totals.interactions, totals.people, totals.refused);
         fmt::print("This scan read {} new or changed files, found {} moved and {} gone.\n",
                    summary.read, summary.renamed, summary.removed);
     }

@@ -245,6 +245,12 @@ std::vector<std::string> IndexerProcess::arguments() const {
     add("--photos", options_.photos);
     add("--places", options_.places);
     if (!options_.gazetteer.empty()) add("--gazetteer", {options_.gazetteer});
+    add("--messages", options_.messages);
+    add("--contacts", options_.contacts);
+    if (!options_.ownerAddresses.empty()) {
+        words.emplace_back("--owner");
+        words.insert(words.end(), options_.ownerAddresses.begin(), options_.ownerAddresses.end());
+    }
     return words;
 }
 

@@ -22,6 +22,9 @@ struct IndexerOptions {
     std::vector<std::filesystem::path> photos;
     std::vector<std::filesystem::path> places;
     std::filesystem::path gazetteer;  ///< Empty when there is none.
+    std::vector<std::filesystem::path> messages;
+    std::vector<std::filesystem::path> contacts;
+    std::vector<std::string> ownerAddresses;
     /// Seconds after which `refresh` returns though the scan goes on; the next one joins it.
     double replyLimit = 100;
     /// Seconds after which a scan is ended in order.

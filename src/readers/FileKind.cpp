@@ -4,9 +4,11 @@
 #include <string>
 #include <string_view>
 
+#include "core/Text.h"
 #include "readers/FileReaders.h"
 #include "readers/FitMessages.h"
 #include "readers/JsonStream.h"
+#include "readers/MailHeaders.h"
 
 namespace keepsakes {
 
@@ -15,6 +17,7 @@ namespace {
 using namespace std::string_view_literals;
 
 constexpr auto kJpeg = "\xFF\xD8\xFF"sv;
+constexpr auto kSqlite = "SQLite format 3\0"sv;
 constexpr auto kPng = "\x89PNG\r\n\x1A\n"sv;
 // ISO/IEC 23008-12 and AV1 Image File Format: brands of still images and bursts.
 constexpr auto kHeifBrands = std::to_array<std::string_view>(
@@ -128,6 +131,62 @@ bool isOwnTracksLine(std::string_view head) {
     return kindEnd != std::string_view::npos && rest[kindEnd] == '\t';
 }
 
+/// Names that stand in the first lines of every mail's header (RFC 5322 and 3834, common practice).
+constexpr auto kMailFields =
+    std::to_array<std::string_view>({"arc-",         "authentication-results",
+                                     "bcc",          "cc",
+                                     "content-",     "date",
+                                     "delivered-to", "delivery-date",
+                                     "dkim-",        "envelope-to",
+                                     "errors-to",    "from",
+                                     "in-reply-to",  "list-",
+                                     "mailing-list", "message-id",
+                                     "mime-version", "organization",
+                                     "received",     "references",
+                                     "reply-to",     "resent-",
+                                     "return-path",  "sender",
+                                     "status",       "subject",
+                                     "thread-",      "to",
+                                     "user-agent",   "x-"});
+
+bool isMailField(std::string_view line) {
+    const auto name = lowerCased(line.substr(0, std::min(line.find(':'), line.size())));
+    return std::ranges::any_of(kMailFields, [&name](std::string_view field) {
+        return name == field || (field.ends_with('-') && name.starts_with(field));
+    });
+}
+
+/// Whether the lines from the start, up to the first empty one, are a mail's header: fields alone,
+/// at least two of them known.
+bool isMailHeader(std::string_view text) {
+    int known = 0;
+    bool isFirst = true;
+    while (!text.empty()) {
+        const auto end = text.find('\n');
+        auto line = text.substr(0, end);
+        const bool isCut = end == std::string_view::npos;
+        text.remove_prefix(isCut ? text.size() : end + 1);
+        if (line.ends_with('\r')) line.remove_suffix(1);
+        if (line.empty() || isCut) break;
+        const bool goesOn = !isFirst && (line.front() == ' ' || line.front() == '\t');
+        isFirst = false;
+        if (goesOn) continue;
+        if (!isHeaderLine(line)) return false;
+        known += isMailField(line) ? 1 : 0;
+    }
+    return known >= 2;
+}
+
+FileKind kindOfText(std::string_view text) {
+    const auto end = std::min(text.find('\n'), text.size());
+    auto line = text.substr(0, end);
+    if (line.ends_with('\r')) line.remove_suffix(1);
+    if (lowerCased(line) == "begin:vcard") return FileKind::contacts;
+    if (isMailHeader(text)) return FileKind::mail;
+    text.remove_prefix(std::min(end + 1, text.size()));
+    return isMailSeparator(line) && isMailHeader(text) ? FileKind::mailbox : FileKind::unknown;
+}
+
 }  // namespace
 
 FileKind kindOf(std::span<const std::byte> head) {
@@ -144,11 +203,13 @@ FileKind kindOf(std::span<const std::byte> head) {
         bytes.starts_with("<\0"sv) || bytes.starts_with("\0<"sv)) {
         std::erase(bytes, '\0');
     }
+    if (bytes.starts_with(kSqlite)) return FileKind::chatHistory;
     const auto first = bytes.find_first_not_of(" \t\r\n\xEF\xBB\xBF\xFE\xFF");
     if (first == std::string::npos) return FileKind::unknown;
     if (bytes[first] == '{' || bytes[first] == '[') return kindOfJson(bytes);
-    if (bytes[first] != '<') return FileKind::unknown;
+    if (bytes[first] != '<') return kindOfText(std::string_view(bytes).substr(first));
     const auto root = rootName(bytes);
+    if (root == "smses" || root == "calls") return FileKind::messageBackup;
     return root == "gpx" || root == "TrainingCenterDatabase" ? FileKind::track : FileKind::unknown;
 }
 

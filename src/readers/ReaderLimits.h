@@ -76,4 +76,18 @@ inline constexpr std::size_t kMostNames = 100;
 /// Bytes of a keyword or a name; a longer one is passed over.
 inline constexpr std::size_t kLongestName = 256;
 
+// People.
+
+/// Bytes of a header field or of a card's line that are looked at.
+inline constexpr std::size_t kLongestField = std::size_t{64} * 1024;
+/// A mail to more is one to a crowd.
+inline constexpr std::size_t kMostRecipients = 50;
+/// Cards of one file, and numbers and addresses of one card.
+inline constexpr std::size_t kMostCards = 100000;
+inline constexpr std::size_t kMostHandles = 100;
+/// A call lasts a day at most, in seconds.
+inline constexpr double kLongestCall = 86400;
+/// Bytes of a messenger's database with its log: it is copied into memory.
+inline constexpr std::uint64_t kLargestChatHistory = std::uint64_t{256} * 1024 * 1024;
+
 }  // namespace keepsakes::limits

@@ -70,6 +70,19 @@ std::vector<std::string> foldedWords(std::string_view words) {
     return folded;
 }
 
+std::string utf8Text(std::string_view bytes, const std::string& charset) {
+    auto text = decode(bytes);
+    if (!charset.empty()) {
+        const icu::UnicodeString other(bytes.data(), static_cast<std::int32_t>(bytes.size()),
+                                       charset.c_str());
+        // ICU answers an empty text for a charset that it does not know.
+        if (!other.isBogus() && !other.isEmpty()) text = other;
+    }
+    std::string utf8;
+    text.toUTF8String(utf8);
+    return utf8;
+}
+
 std::string cleanText(std::string_view bytes) {
     auto text = decode(bytes);
     icu::UnicodeString kept;

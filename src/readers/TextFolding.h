@@ -20,4 +20,8 @@ std::vector<std::string> foldedWords(std::string_view words);
 /// taken for windows-1252, which old cameras and editors write.
 std::string cleanText(std::string_view bytes);
 
+/// The text of that charset as valid UTF-8, otherwise unchanged. Of no charset, or one that nobody
+/// knows, it is UTF-8 or else windows-1252.
+std::string utf8Text(std::string_view bytes, const std::string& charset);
+
 }  // namespace keepsakes

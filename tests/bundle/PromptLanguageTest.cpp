@@ -59,6 +59,13 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
     far->mode = KSPlaceMode::tourist;
     EXPECT_EQ(prompt("", {far}), "A visit away from home: Lake, Saturday 10:02");
     EXPECT_EQ(prompt("", {home, far}), "A visit: Elm Street, Lake, Saturday 10:02");
+    const auto contact = makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
+                                   KSEventCategory::significantContact);
+    contact->interactionScoredContact = KSDictionary{{"name", "Anna"}};
+    contact->interactions = {{KSDictionary{{"mechanism", 2}}, KSDictionary{{"mechanism", 4}},
+                              KSDictionary{{"mechanism", 0}}}};
+    EXPECT_EQ(prompt("SignificantContactInteraction", {contact}),
+              "In touch with somebody close: Anna, Saturday 10:02 to 12:31, 2 messages and 1 call");
     EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
                                     KSEventCategory::topic)}),
               "A moment: Saturday 10:02 to 12:31");

@@ -21,8 +21,8 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
         universe.serviceNames(),
         ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
                     "PhotoManager", "RoutineServiceManager", "VitalsManager",
-                    "NowPlayingMediaManager", "DefaultsManager", "EventManager",
-                    "EventBundleManager", "Server", "DaemonClientNotifier",
+                    "NowPlayingMediaManager", "SignificantContactManager", "DefaultsManager",
+                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier",
                     "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
                     "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
                     "EventPurgeSchedulerNotifier", "DaemonAnalytics"));

@@ -31,9 +31,11 @@ std::string escapes(const std::string& outside) {
 
 class PlantedReader final : public TextReader {
   public:
-    std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted, KSDate now,
-                                                                LocationSink& places) override {
-        auto records = TextReader::read(fd, wanted, now, places);
+    std::expected<std::optional<FileRecords>, std::string> read(int fd, int wanted,
+                                                                const ReaderContext& context,
+                                                                LocationSink& places,
+                                                                PeopleSink& people) override {
+        auto records = TextReader::read(fd, wanted, context, places, people);
         const auto content = reads.back();
         if (content.starts_with("crash")) {
             std::signal(SIGSEGV, SIG_DFL);  // a sanitizer would make an exit status of it

@@ -21,8 +21,9 @@ namespace keepsakes {
 /// A file that begins with anything else is of another kind.
 class TextReader : public FileReader {
   public:
-    std::expected<std::optional<FileRecords>, std::string> read(int fd, int, KSDate,
-                                                                LocationSink& places) override {
+    std::expected<std::optional<FileRecords>, std::string> read(int fd, int, const ReaderContext&,
+                                                                LocationSink& places,
+                                                                PeopleSink&) override {
         std::string content(65536, '\0');
         const auto count = ::pread(fd, content.data(), content.size(), 0);
         content.resize(count > 0 ? static_cast<std::size_t>(count) : 0);

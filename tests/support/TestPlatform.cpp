@@ -126,6 +126,33 @@ void FakeNowPlayingStream::read(KSDate start, const EachRecord& each,
     completion(std::nullopt);
 }
 
+InteractionStore::Interactions FakeInteractionStore::queryInteractions(
+    const InteractionQuery& query) {
+    asked.push_back(query);
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    std::vector<Interaction> found;
+    std::ranges::copy_if(interactions, std::back_inserter(found), [&query](const auto& one) {
+        return one.startDate >= query.startsFrom && one.endDate <= query.endsUntil &&
+               std::ranges::find(query.mechanisms, one.mechanism) != query.mechanisms.end();
+    });
+    std::ranges::stable_sort(
+        found, [](const auto& a, const auto& b) { return b.startDate < a.startDate; });
+    if (found.size() > query.limit) found.resize(query.limit);
+    return found;
+}
+
+ContactStore::Contacts FakeContactStore::rankedContacts(
+    std::span<const std::string> personIdentifiers) {
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    std::vector<RankedContact> found;
+    std::ranges::copy_if(contacts, std::back_inserter(found), [&](const auto& contact) {
+        std::string_view person = contact.identifier;
+        if (person.starts_with(kContactPrefix)) person.remove_prefix(kContactPrefix.size());
+        return std::ranges::find(personIdentifiers, person) != personIdentifiers.end();
+    });
+    return found;
+}
+
 void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
     const std::lock_guard lock(mutex_);
     sent_.emplace_back(event, fields);
@@ -231,6 +258,8 @@ TestPlatform::TestPlatform() {
     services.photoAnalysis = &photos;
     services.routineService = &routine;
     services.nowPlayingStream = &media;
+    services.interactionStore = &interactions;
+    services.contactStore = &contacts;
     services.deviceData = &deviceData;
     services.activities = &activities;
     services.problems = &problems;

@@ -15,8 +15,10 @@
 #include "core/WorkQueue.h"
 #include "platform/AnalyticsService.h"
 #include "platform/BackgroundActivities.h"
+#include "platform/ContactStore.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/HealthStore.h"
+#include "platform/InteractionStore.h"
 #include "platform/MediaStream.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
@@ -108,6 +110,26 @@ class FakeNowPlayingStream final : public NowPlayingStream {
               const std::function<void(OptionalError)>& completion) override;
 };
 
+/// A record of communications in memory: answers as the real one does, fails when told to, tells
+/// what it was asked.
+class FakeInteractionStore final : public InteractionStore {
+  public:
+    std::vector<Interaction> interactions;
+    std::optional<KSError> nextError;
+    std::vector<InteractionQuery> asked;
+
+    Interactions queryInteractions(const InteractionQuery& query) override;
+};
+
+/// The owner's contacts in memory, likewise.
+class FakeContactStore final : public ContactStore {
+  public:
+    std::vector<RankedContact> contacts;
+    std::optional<KSError> nextError;
+
+    Contacts rankedContacts(std::span<const std::string> personIdentifiers) override;
+};
+
 class FakeAnalytics final : public AnalyticsService {
   public:
     void send(std::string_view event, const KSDictionary& fields) override;
@@ -168,6 +190,8 @@ struct TestPlatform {
     FakePhotoAnalysis photos;
     FakeRoutineService routine;
     FakeNowPlayingStream media;
+    FakeInteractionStore interactions;
+    FakeContactStore contacts;
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;

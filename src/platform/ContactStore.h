@@ -1,0 +1,39 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <expected>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "core/KSError.h"
+
+namespace keepsakes {
+
+/// Stands in front of a contact's identifier.
+inline constexpr std::string_view kContactPrefix = "CN:";
+
+/// Somebody in the owner's address books.
+struct RankedContact {
+    std::string identifier;  ///< The person's, behind `kContactPrefix`.
+    std::string name;
+    double score = 0;  ///< How close the owner and the contact are in touch, 0 to 1.
+
+    friend bool operator==(const RankedContact&, const RankedContact&) = default;
+};
+
+/// The contacts of the personal profile service. Any thread may call it; it blocks the caller and
+/// changes nothing.
+class ContactStore {
+  public:
+    using Contacts = std::expected<std::vector<RankedContact>, KSError>;
+
+    virtual ~ContactStore() = default;
+
+    /// The contacts of these persons (without the prefix), in no particular order; persons who are
+    /// no contacts are left out.
+    virtual Contacts rankedContacts(std::span<const std::string> personIdentifiers) = 0;
+};
+
+}  // namespace keepsakes
