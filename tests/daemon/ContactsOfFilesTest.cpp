@@ -8,8 +8,7 @@
 #include "daemon/KSDaemonUniverse.h"
 #include "devicedata/IndexedContactStore.h"
 #include "devicedata/IndexedInteractionStore.h"
-#include "indexer/ContentReader.h"
-#include "indexer/FolderScan.h"
+#include "support/ScannedFolders.h"
 #include "support/TestPlatform.h"
 
 namespace keepsakes {
@@ -18,41 +17,6 @@ namespace {
 namespace fs = std::filesystem;
 using testing::ElementsAre;
 using testing::IsEmpty;
-
-class SilentReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { ADD_FAILURE() << line; }
-    void report(const ScanSummary&) override {}
-};
-
-/// Scans real folders in this process.
-class ScannedFolders final : public DeviceDataIndex {
-  public:
-    ScannedFolders(fs::path root, Clock& clock) : root_(std::move(root)), clock_(clock) {}
-
-    ScanReport refresh(const Progress&) override {
-        ContentReader reader;
-        SilentReporter reporter;
-        const auto mark = ReadMark::take(root_ / "mark");
-        const auto error = scanFolders({.index = root_ / "index.sqlite",
-                                        .tracks = {},
-                                        .photos = {},
-                                        .messages = {root_ / "Mail"},
-                                        .contacts = {root_ / "Contacts"},
-                                        .ownerAddresses = {"me@example.org"},
-                                        .now = clock_.now()},
-                                       reader, **mark, reporter);
-        EXPECT_FALSE(error) << error->description();
-        return {.complete = true};
-    }
-    ScanReport lastReport() const override { return {}; }
-    void stop() override {}
-
-  private:
-    const fs::path root_;
-    Clock& clock_;
-};
 
 /// The whole daemon over mails and address books on disk.
 class ContactsOfFiles : public testing::Test {
@@ -110,7 +74,15 @@ class ContactsOfFiles : public testing::Test {
     TestPlatform platform_;
     IndexedInteractionStore interactions_{root_ / "index.sqlite"};
     IndexedContactStore contacts_{root_ / "index.sqlite"};
-    ScannedFolders folders_{root_.path(), platform_.clock};
+    ScannedFolders folders_{[this] {
+        return ScanOptions{.index = root_ / "index.sqlite",
+                           .tracks = {},
+                           .photos = {},
+                           .messages = {root_ / "Mail"},
+                           .contacts = {root_ / "Contacts"},
+                           .ownerAddresses = {"me@example.org"},
+                           .now = platform_.clock.now()};
+    }};
     std::unique_ptr<KSDaemonUniverse> universe_;
     std::shared_ptr<KSEventManager> events_;
 };
