@@ -45,8 +45,10 @@ CREATE TABLE photos(
     latitude REAL,
     longitude REAL,
     words TEXT,
+    keywords TEXT,  -- folded, a line each
     occasion INTEGER,
     PRIMARY KEY(file, number)) WITHOUT ROWID;
+CREATE INDEX photosByTaken ON photos(taken) WHERE keywords IS NOT NULL;
 CREATE TABLE occasions(
     id INTEGER PRIMARY KEY,
     identifier TEXT NOT NULL UNIQUE,

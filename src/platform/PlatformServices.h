@@ -22,6 +22,7 @@ class PowerSources;
 class Problems;
 class RoutineService;
 class SystemNotifications;
+class TopicStore;
 class UserDefaults;
 
 /// What the daemon may do by itself; fixed at start by the owner's diagnostics policy.
@@ -49,6 +50,7 @@ struct PlatformServices {
     NowPlayingStream* nowPlayingStream = nullptr;
     InteractionStore* interactionStore = nullptr;
     ContactStore* contactStore = nullptr;
+    TopicStore* topicStore = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;

@@ -24,6 +24,7 @@
 #include "platform/PlatformServices.h"
 #include "platform/RoutineService.h"
 #include "platform/SystemNotifications.h"
+#include "platform/TopicStore.h"
 #include "platform/UserDefaults.h"
 #include "support/FakeDeviceState.h"
 #include "support/TemporaryFolder.h"
@@ -130,6 +131,16 @@ class FakeContactStore final : public ContactStore {
     Contacts rankedContacts(std::span<const std::string> personIdentifiers) override;
 };
 
+/// A topic store in memory, likewise: the same scores for every interval.
+class FakeTopicStore final : public TopicStore {
+  public:
+    std::map<std::string, double> scores;
+    std::optional<KSError> nextError;
+    std::vector<std::pair<std::string, TopicQuery>> asked;
+
+    Scores scoresForTopicMapping(std::string_view mapping, const TopicQuery& query) override;
+};
+
 class FakeAnalytics final : public AnalyticsService {
   public:
     void send(std::string_view event, const KSDictionary& fields) override;
@@ -192,6 +203,7 @@ struct TestPlatform {
     FakeNowPlayingStream media;
     FakeInteractionStore interactions;
     FakeContactStore contacts;
+    FakeTopicStore topics;
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
