@@ -17,6 +17,7 @@
 #include "devicedata/MediaStreamFile.h"
 #include "linux/ActivityTimers.h"
 #include "linux/AnalyticsLog.h"
+#include "linux/BluezDevices.h"
 #include "linux/BusThread.h"
 #include "linux/IndexerProcess.h"
 #include "linux/LogindLockState.h"
@@ -131,6 +132,9 @@ struct DevicePorts::Adapters {
           activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
           topics(folders.cache / kIndexFile, configuration.deviceData.topicWords, media, problems),
+          nearby(configuration.nearby.devices
+                     ? std::make_unique<BluezDevices>(*clock, configuration.nearby.scan)
+                     : nullptr),
           memory(*clock),
           watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {
         systemBus.start();
@@ -157,6 +161,7 @@ struct DevicePorts::Adapters {
     ActivityTimers activities;
     MediaStreamFile media;
     IndexedTopicStore topics;
+    std::unique_ptr<BluezDevices> nearby;
     MemoryRelease memory;
     std::unique_ptr<MediaWatcher> watcher;
 };
@@ -179,6 +184,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.interactionStore = &adapters_->interactions;
     services_.contactStore = &adapters_->contacts;
     services_.topicStore = &adapters_->topics;
+    services_.nearbyDevices = adapters_->nearby.get();
     services_.deviceData = &adapters_->deviceData;
     services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;

@@ -136,6 +136,9 @@ CREATE TABLE cards(
     handles TEXT NOT NULL,
     fromPhone INTEGER NOT NULL);
 CREATE INDEX cardsByFile ON cards(file);
+CREATE INDEX cardsByUid ON cards(uid);
+CREATE TABLE relations(file INTEGER NOT NULL, relationship TEXT NOT NULL, name TEXT NOT NULL);
+CREATE INDEX relationsByFile ON relations(file);
 CREATE TABLE ownerHandles(file INTEGER NOT NULL, handle INTEGER NOT NULL);
 CREATE INDEX ownerHandlesByFile ON ownerHandles(file);
 CREATE TABLE people(

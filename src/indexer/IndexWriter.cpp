@@ -275,7 +275,7 @@ void IndexWriter::removePeople(std::int64_t file) {
     begin();
     for (const char* text :
          {"DELETE FROM interactions WHERE file = ?", "DELETE FROM cards WHERE file = ?",
-          "DELETE FROM ownerHandles WHERE file = ?"}) {
+          "DELETE FROM relations WHERE file = ?", "DELETE FROM ownerHandles WHERE file = ?"}) {
         auto& remove = statement(text);
         remove.bind(1, file);
         if (remove.exec() == 0) continue;

@@ -10,11 +10,10 @@
 
 #include "core/Problems.h"
 #include "devicedata/IndexSchema.h"
-#include "devicedata/MediaStreamFile.h"
 #include "devicedata/TopicWords.h"
 #include "platform/TopicCatalogue.h"
 #include "support/TemporaryFolder.h"
-#include "support/VirtualClock.h"
+#include "support/TestPlatform.h"
 
 namespace keepsakes {
 namespace {
@@ -62,7 +61,7 @@ class Topics : public testing::Test {
         for (const auto state : {PlaybackState::playing, PlaybackState::stopped}) {
             record.playbackState = state;
             record.absoluteTimestamp = {start};
-            EXPECT_EQ(stream.append(record), std::nullopt);
+            stream.records.push_back(record);
             start += seconds;
         }
     }
@@ -88,9 +87,8 @@ class Topics : public testing::Test {
     TemporaryFolder folder;
     const std::filesystem::path path = folder / "deviceData.sqlite";
     int files = 0;
-    VirtualClock clock{{kDay}};
+    FakeNowPlayingStream stream;
     Problems problems;
-    MediaStreamFile stream{folder / "mediaStream.sqlite", clock, problems};
     IndexedTopicStore store{path, folder / "topics.txt", stream, problems};
 };
 
@@ -175,8 +173,7 @@ TEST_F(Topics, ClearEvidenceReachesTheThresholdAndStrayEvidenceDoesNot) {
         const std::string what = row.what;
         if (!what.starts_with("and ")) {
             execute("DELETE FROM photos; DELETE FROM workouts");
-            clock.advance(40 * kDay);  // Drops the plays.
-            std::filesystem::remove(folder / "mediaStream.sqlite");
+            stream.records.clear();
         }
         row.add();
         EXPECT_EQ(score(row.topic) >= kEnough, row.isEnough) << what << ": " << score(row.topic);

@@ -153,6 +153,17 @@ ContactStore::Contacts FakeContactStore::rankedContacts(
     return found;
 }
 
+std::expected<std::vector<RelatedPerson>, KSError> FakeContactStore::relatedPeople() {
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    return related;
+}
+
+NearbyDevices::Devices FakeNearbyDevices::devicesNear() {
+    ++asked;
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    return names;
+}
+
 TopicStore::Scores FakeTopicStore::scoresForTopicMapping(std::string_view mapping,
                                                          const TopicQuery& query) {
     asked.emplace_back(mapping, query);

@@ -20,6 +20,7 @@
 #include "platform/HealthStore.h"
 #include "platform/InteractionStore.h"
 #include "platform/MediaStream.h"
+#include "platform/NearbyDevices.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
 #include "platform/RoutineService.h"
@@ -128,7 +129,21 @@ class FakeContactStore final : public ContactStore {
     std::vector<RankedContact> contacts;
     std::optional<KSError> nextError;
 
+    std::vector<RelatedPerson> related;
+
     Contacts rankedContacts(std::span<const std::string> personIdentifiers) override;
+    std::expected<std::vector<RelatedPerson>, KSError> relatedPeople() override;
+};
+
+/// A radio in memory: knows devices, fails when told to, counts how often it was asked.
+class FakeNearbyDevices final : public NearbyDevices {
+  public:
+    std::vector<std::string> names;
+    std::optional<KSError> nextError;
+    int asked = 0;
+
+    Devices devicesNear() override;
+    void stop() override {}
 };
 
 /// A topic store in memory, likewise: the same scores for every interval.
@@ -204,6 +219,7 @@ struct TestPlatform {
     FakeInteractionStore interactions;
     FakeContactStore contacts;
     FakeTopicStore topics;
+    FakeNearbyDevices nearby;  ///< Not among the services until a test puts it there.
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
