@@ -69,6 +69,20 @@ std::string playedText(double repetitions, double seconds) {
     return text + fmt::format("{} h {} min", minutes / 60, minutes % 60);
 }
 
+/// The strongest first.
+std::string topicsText(const KSDictionary& scoredTopics) {
+    std::vector<std::pair<double, std::string>> topics;
+    for (const auto& [name, score] : KSEvent::_displayNameOfScoredTopics(scoredTopics)) {
+        topics.emplace_back(-score.asNumber().value_or(0), name);
+    }
+    std::ranges::sort(topics);
+    std::string text;
+    for (const auto& [negated, name] : topics) {
+        text += fmt::format("{}{} {:.2f}", text.empty() ? "" : ", ", name, -negated);
+    }
+    return text;
+}
+
 /// What tells one event from another of its kind.
 std::string detailsOf(const KSEvent& event) {
     std::string details;
@@ -93,6 +107,7 @@ std::string detailsOf(const KSEvent& event) {
         add(contact.countText());
         if (contact.score) add(fmt::format("score {:.2f}", *contact.score));
     }
+    if (event.scoredTopics) add(topicsText(*event.scoredTopics));
     if (const auto& photos = event.extendedAttributes) {
         for (const auto& word :
              photos->photoKeepsakeInferences.value_or(std::vector<std::string>())) {

@@ -16,6 +16,7 @@
 #include "model/KSExtensions.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/PlatformServices.h"
+#include "sources/KSDiscoveryManager.h"
 #include "store/Availability.h"
 #include "store/KSDefaultsManager.h"
 #include "store/KSEventStore.h"
@@ -81,6 +82,7 @@ KSEventManager::KSEventManager(const PlatformServices& platform,
       defaultsManager_(std::move(defaultsManager)),
       eventStore_(std::move(eventStore)),
       sources_(std::move(sources)),
+      discoveryManager_(KSDiscoveryManager::initWithPlatform(platform)),
       queue_("KSEventManager"),
       refreshQueue_("KSEventManager.deviceData"),
       metricsQueue_("KSEventManager.metrics") {}
@@ -130,6 +132,7 @@ void KSEventManager::collectEventsWithHandler(ResultHandler handler) {
 void KSEventManager::_collectEvents(const ResultHandler& handler) {
     const KSDate end = platform_.clock->now();
     const auto chosen = defaultsManager_->objectForKey(kCollectionStartKey).asDate();
+    if (discoveryManager_) discoveryManager_->submitProximity();
     const KSDate start = chosen && *chosen <= end ? *chosen : end - kDefaultWindowSeconds;
     _collectEventsBetweenStartDate(start, end, handler);
 }

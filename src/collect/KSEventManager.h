@@ -16,6 +16,7 @@ namespace keepsakes {
 
 class EventSources;
 class KSDefaultsManager;
+class KSDiscoveryManager;
 class KSEventStore;
 class KSPersistenceManager;
 struct PlatformServices;
@@ -45,6 +46,7 @@ class KSEventManager final : public KSService {
 
     /// Brings the index of the owner's files up to date, then collects from the start date in the
     /// defaults store, when there is one that is not in the future, or else from three days ago.
+    /// Nearby devices are counted meanwhile, where the owner wants that; nothing waits for it.
     void collectEventsWithHandler(ResultHandler handler);
     void collectEventsBetweenStartDate(KSDate start, KSDate end, ResultHandler handler);
     void storeEvents(KSEventArray events, ResultHandler handler);
@@ -84,7 +86,8 @@ class KSEventManager final : public KSService {
     const std::shared_ptr<KSDefaultsManager> defaultsManager_;
     const std::shared_ptr<KSEventStore> eventStore_;
     const std::unique_ptr<EventSources> sources_;
-    ProgressObserver progressObserver_;  // only on refreshQueue_
+    const std::shared_ptr<KSDiscoveryManager> discoveryManager_;  ///< Where devices are counted.
+    ProgressObserver progressObserver_;                           // only on refreshQueue_
     WorkQueue queue_;
     WorkQueue refreshQueue_;  // waits for the scan of the owner's files
     WorkQueue metricsQueue_;  // waits for the owner's age and sex

@@ -7,6 +7,7 @@
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "sources/KSSignificantContactManager.h"
+#include "sources/KSTopicManager.h"
 #include "sources/KSVitalsManager.h"
 
 namespace keepsakes {
@@ -24,6 +25,7 @@ EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
       routineServiceManager_(universe.service<KSRoutineServiceManager>("RoutineServiceManager")),
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
+      topicManager_(universe.service<KSTopicManager>("TopicManager")),
       nowPlayingMediaManager_(universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")),
       significantContactManager_(
           universe.service<KSSignificantContactManager>("SignificantContactManager")) {
@@ -47,6 +49,15 @@ EventSources::EventSources(const ServiceLookup& universe)
              [source = photoManager_](KSDate start, KSDate end, const ResultHandler& done) {
                  source->fetchAndSavePhotoKeepsakesBetweenStartDate(start, end, done);
              }});
+    }
+    if (topicManager_) {
+        // Whatever the window is: of the day before its end.
+        steps_.push_back({"resultTopicsSuccess",
+                          [source = topicManager_](KSDate, KSDate end, ResultHandler done) {
+                              source->fetchAndSaveScoredTopicsBetweenStartDate(
+                                  KSTopicManager::startOfDayBefore(end),
+                                  KSTopicManager::endOfDayBefore(end), std::move(done));
+                          }});
     }
     if (nowPlayingMediaManager_) {
         steps_.push_back(
@@ -118,6 +129,12 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         case KSEventCategory::photoKeepsake:
             if (photoManager_) {
                 photoManager_->rehydratePhotoKeepsakes(group, std::move(handler));
+                return;
+            }
+            break;
+        case KSEventCategory::topic:
+            if (topicManager_) {
+                handler(topicManager_->rehydratedScoredTopicsEvents(group), std::nullopt);
                 return;
             }
             break;

@@ -16,6 +16,7 @@ class KSNowPlayingMediaManager;
 class KSPhotoManager;
 class KSRoutineServiceManager;
 class KSSignificantContactManager;
+class KSTopicManager;
 class KSVitalsManager;
 
 /// One source's part of a collection.
@@ -49,6 +50,7 @@ class EventSources {
     std::shared_ptr<KSVitalsManager> vitalsManager_;
     std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
     std::shared_ptr<KSPhotoManager> photoManager_;
+    std::shared_ptr<KSTopicManager> topicManager_;
     std::shared_ptr<KSNowPlayingMediaManager> nowPlayingMediaManager_;
     std::shared_ptr<KSSignificantContactManager> significantContactManager_;
     std::vector<CollectionStep> steps_;

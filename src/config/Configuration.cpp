@@ -153,6 +153,7 @@ std::vector<Key> keysOf(Configuration& to) {
         {"device_data", "contacts", folders(to.deviceData.contacts)},
         {"device_data", "places", folders(to.deviceData.places)},
         {"device_data", "gazetteer", file(to.deviceData.gazetteer)},
+        {"device_data", "topic_words", file(to.deviceData.topicWords)},
         {"device_data", "media", boolean(to.deviceData.media)},
         {"owner", "date_of_birth", localDate(to.owner.dateOfBirth)},
         {"owner", "biological_sex", biologicalSex(to.owner.biologicalSex)},

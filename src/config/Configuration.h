@@ -31,7 +31,8 @@ struct Configuration {
         Folders messages;
         Folders contacts;
         Folders places;
-        std::filesystem::path gazetteer;  ///< A file; empty when there is none.
+        std::filesystem::path gazetteer;   ///< A file; empty when there is none.
+        std::filesystem::path topicWords;  ///< A file; empty when there is none.
         bool media = true;
     } deviceData;
 

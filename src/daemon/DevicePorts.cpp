@@ -13,9 +13,11 @@
 #include "devicedata/IndexedInteractionStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "devicedata/IndexedRoutineService.h"
+#include "devicedata/IndexedTopicStore.h"
 #include "devicedata/MediaStreamFile.h"
 #include "linux/ActivityTimers.h"
 #include "linux/AnalyticsLog.h"
+#include "linux/BluezDevices.h"
 #include "linux/BusThread.h"
 #include "linux/IndexerProcess.h"
 #include "linux/LogindLockState.h"
@@ -129,6 +131,10 @@ struct DevicePorts::Adapters {
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
+          topics(folders.cache / kIndexFile, configuration.deviceData.topicWords, media, problems),
+          nearby(configuration.nearby.devices
+                     ? std::make_unique<BluezDevices>(*clock, configuration.nearby.scan)
+                     : nullptr),
           memory(*clock),
           watcher(mediaWatcher(configuration.deviceData.media, media, *clock)) {
         systemBus.start();
@@ -154,6 +160,8 @@ struct DevicePorts::Adapters {
     IndexerProcess deviceData;
     ActivityTimers activities;
     MediaStreamFile media;
+    IndexedTopicStore topics;
+    std::unique_ptr<BluezDevices> nearby;
     MemoryRelease memory;
     std::unique_ptr<MediaWatcher> watcher;
 };
@@ -175,6 +183,8 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.nowPlayingStream = &adapters_->media;
     services_.interactionStore = &adapters_->interactions;
     services_.contactStore = &adapters_->contacts;
+    services_.topicStore = &adapters_->topics;
+    services_.nearbyDevices = adapters_->nearby.get();
     services_.deviceData = &adapters_->deviceData;
     services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;

@@ -25,6 +25,7 @@
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "sources/KSSignificantContactManager.h"
+#include "sources/KSTopicManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
 #include "store/KSEventStore.h"
@@ -58,6 +59,7 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
     add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
     add("SignificantContactManager", KSSignificantContactManager::initWithUniverse(*this));
+    add("TopicManager", KSTopicManager::initWithUniverse(*this));
     add("DefaultsManager", std::make_shared<KSDefaultsManager>(*platform.userDefaults));
     add("EventManager", KSEventManager::initWithUniverse(*this));
     const auto bundleManager = KSEventBundleManager::initWithUniverse(*this);

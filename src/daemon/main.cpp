@@ -24,6 +24,7 @@
 #include "platform/BackgroundActivities.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/DeviceState.h"
+#include "platform/NearbyDevices.h"
 #include "store/KSPersistenceManager.h"
 #include "wire/BusListener.h"
 
@@ -136,6 +137,7 @@ int runDaemon(const Arguments& arguments, MainLoop& mainLoop) {
     (*listener)->invalidate();
     services.activities->stop();
     services.deviceData->stop();
+    if (services.nearbyDevices) services.nearbyDevices->stop();
     WorkerThreads::shared().settle();
     report.reset();
     universe.reset();

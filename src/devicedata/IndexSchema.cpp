@@ -45,8 +45,10 @@ CREATE TABLE photos(
     latitude REAL,
     longitude REAL,
     words TEXT,
+    keywords TEXT,  -- folded, a line each
     occasion INTEGER,
     PRIMARY KEY(file, number)) WITHOUT ROWID;
+CREATE INDEX photosByTaken ON photos(taken) WHERE keywords IS NOT NULL;
 CREATE TABLE occasions(
     id INTEGER PRIMARY KEY,
     identifier TEXT NOT NULL UNIQUE,
@@ -134,6 +136,9 @@ CREATE TABLE cards(
     handles TEXT NOT NULL,
     fromPhone INTEGER NOT NULL);
 CREATE INDEX cardsByFile ON cards(file);
+CREATE INDEX cardsByUid ON cards(uid);
+CREATE TABLE relations(file INTEGER NOT NULL, relationship TEXT NOT NULL, name TEXT NOT NULL);
+CREATE INDEX relationsByFile ON relations(file);
 CREATE TABLE ownerHandles(file INTEGER NOT NULL, handle INTEGER NOT NULL);
 CREATE INDEX ownerHandlesByFile ON ownerHandles(file);
 CREATE TABLE people(

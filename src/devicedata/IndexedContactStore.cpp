@@ -23,4 +23,23 @@ ContactStore::Contacts IndexedContactStore::rankedContacts(
     return contacts;
 }
 
+std::expected<std::vector<RelatedPerson>, KSError> IndexedContactStore::relatedPeople() {
+    std::vector<RelatedPerson> related;
+    const auto answered = index_.ask([&related](SQLite::Database& index) {
+        // A card names another one by its identifier, with the prefix of URIs or without.
+        SQLite::Statement query(
+            index,
+            "SELECT DISTINCT relationship, coalesce(cards.name, relations.name) AS person"
+            " FROM relations LEFT JOIN cards ON cards.uid <> ''"
+            " AND cards.uid IN (relations.name, 'urn:uuid:' || relations.name)"
+            " WHERE person <> '' ORDER BY relationship, person");
+        while (query.executeStep()) {
+            related.push_back({.relationship = query.getColumn(0).getString(),
+                               .name = query.getColumn(1).getString()});
+        }
+    });
+    if (!answered) return std::unexpected(answered.error());
+    return related;
+}
+
 }  // namespace keepsakes

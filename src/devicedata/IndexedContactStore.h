@@ -13,6 +13,7 @@ class IndexedContactStore final : public ContactStore {
     explicit IndexedContactStore(std::filesystem::path index) : index_(std::move(index)) {}
 
     Contacts rankedContacts(std::span<const std::string> personIdentifiers) override;
+    std::expected<std::vector<RelatedPerson>, KSError> relatedPeople() override;
 
   private:
     const IndexFile index_;

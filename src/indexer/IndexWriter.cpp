@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "indexer/IndexWriter.h"
 
+#include <fmt/ranges.h>
 #include <sqlite3.h>
 
 #include <cmath>
@@ -239,7 +240,7 @@ void IndexWriter::putRecords(std::int64_t file, const FileRecords& records) {
         if (!isSane(photo.taken) || !isSane(photo.localTime)) continue;
         auto& put = statement(
             "INSERT INTO photos(file, number, taken, timeSource, localTime, latitude, longitude,"
-            " words, occasion) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?)");
+            " words, occasion, keywords) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
         put.clearBindings();
         put.bind(1, file);
         put.bind(2, number);
@@ -254,6 +255,9 @@ void IndexWriter::putRecords(std::int64_t file, const FileRecords& records) {
         if (const auto words = wordsText(photo)) put.bind(8, *words);
         if (const auto former = occasions.find(number); former != occasions.end()) {
             put.bind(9, former->second);
+        }
+        if (!photo.keywords.empty()) {
+            put.bind(10, fmt::format("{}", fmt::join(photo.keywords, "\n")));
         }
         put.exec();
         ++number;
@@ -271,7 +275,7 @@ void IndexWriter::removePeople(std::int64_t file) {
     begin();
     for (const char* text :
          {"DELETE FROM interactions WHERE file = ?", "DELETE FROM cards WHERE file = ?",
-          "DELETE FROM ownerHandles WHERE file = ?"}) {
+          "DELETE FROM relations WHERE file = ?", "DELETE FROM ownerHandles WHERE file = ?"}) {
         auto& remove = statement(text);
         remove.bind(1, file);
         if (remove.exec() == 0) continue;

@@ -26,6 +26,8 @@ PeopleRows::PeopleRows(IndexWriter& index)
                       " sender, recipients) VALUES(?, ?, ?, ?, ?, ?, ?, ?)"),
       addCard_(index.database(),
                "INSERT INTO cards(file, uid, name, handles, fromPhone) VALUES(?, ?, ?, ?, ?)"),
+      addRelation_(index.database(),
+                   "INSERT INTO relations(file, relationship, name) VALUES(?, ?, ?)"),
       addOwner_(index.database(), "INSERT INTO ownerHandles(file, handle) VALUES(?, ?)") {}
 
 void PeopleRows::begin(std::int64_t file) {
@@ -87,6 +89,12 @@ void PeopleRows::card(const ContactCard& card) {
         addCard_.bindNoCopy(4, handles);
         addCard_.bind(5, card.fromPhone ? 1 : 0);
         run(addCard_);
+        for (const auto& relation : card.relations) {
+            addRelation_.bind(1, file_);
+            addRelation_.bind(2, relation.relationship);
+            addRelation_.bind(3, relation.name);
+            run(addRelation_);
+        }
     });
 }
 

@@ -41,6 +41,7 @@ class PeopleRows final : public PeopleSink {
     SQLite::Statement findHandle_;
     SQLite::Statement addInteraction_;
     SQLite::Statement addCard_;
+    SQLite::Statement addRelation_;
     SQLite::Statement addOwner_;
     std::unordered_map<std::string, std::int64_t> known_;
     std::int64_t file_ = 0;

@@ -23,6 +23,14 @@ struct RankedContact {
     friend bool operator==(const RankedContact&, const RankedContact&) = default;
 };
 
+/// Somebody whom an address book relates to the owner or to one of the owner's contacts.
+struct RelatedPerson {
+    std::string relationship;  ///< One of a few words, such as "family" or "friend".
+    std::string name;
+
+    friend bool operator==(const RelatedPerson&, const RelatedPerson&) = default;
+};
+
 /// The contacts of the personal profile service. Any thread may call it; it blocks the caller and
 /// changes nothing.
 class ContactStore {
@@ -34,6 +42,9 @@ class ContactStore {
     /// The contacts of these persons (without the prefix), in no particular order; persons who are
     /// no contacts are left out.
     virtual Contacts rankedContacts(std::span<const std::string> personIdentifiers) = 0;
+
+    /// Each relationship and name once, by these.
+    virtual std::expected<std::vector<RelatedPerson>, KSError> relatedPeople() = 0;
 };
 
 }  // namespace keepsakes

@@ -16,12 +16,14 @@ class DevicePolicy;
 class HealthStore;
 class InteractionStore;
 class LockState;
+class NearbyDevices;
 class NowPlayingStream;
 class PhotoAnalysis;
 class PowerSources;
 class Problems;
 class RoutineService;
 class SystemNotifications;
+class TopicStore;
 class UserDefaults;
 
 /// What the daemon may do by itself; fixed at start by the owner's diagnostics policy.
@@ -34,7 +36,8 @@ struct FeatureSwitches {
 
 /// Everything that the daemon needs from the device it runs on, put together by the composition
 /// root. None is null but the
-/// listener, which a daemon without clients has none of; all outlive the services.
+/// listener, which a daemon without clients has none of, and the nearby devices, where the owner
+/// does not want them counted; all outlive the services.
 struct PlatformServices {
     Clock* clock = nullptr;
     DevicePolicy* devicePolicy = nullptr;
@@ -49,6 +52,8 @@ struct PlatformServices {
     NowPlayingStream* nowPlayingStream = nullptr;
     InteractionStore* interactionStore = nullptr;
     ContactStore* contactStore = nullptr;
+    TopicStore* topicStore = nullptr;
+    NearbyDevices* nearbyDevices = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;

@@ -7,6 +7,8 @@
 #include <array>
 #include <charconv>
 #include <cmath>
+#include <string>
+#include <unordered_map>
 
 #include "readers/CardLine.h"
 #include "readers/Handles.h"
@@ -36,6 +38,43 @@ std::optional<GeoPoint> positionOf(std::string_view text) {
     return GeoPoint{.latitude = degrees[0], .longitude = degrees[1]};
 }
 
+struct RelationWords {
+    std::string_view relationship;
+    std::string_view words;  ///< Apart by blanks.
+};
+
+// RFC 6350, 6.6.6; categories in English, German, French, Spanish, Italian and Dutch; properties of
+// widespread address books.
+constexpr auto kRelations = std::to_array<RelationWords>({
+    {"family",
+     "family child parent sibling spouse kin familie famille familia famiglia verwandte x-spouse "
+     "x-evolution-spouse x-kaddressbook-x-spousesname"},
+    {"friend", "friend friends freund freunde ami amis amigo amigos amico amici vriend vrienden"},
+    {"colleague",
+     "colleague colleagues co-worker kollege kollegen collègue collègues colega colegas collega "
+     "colleghi collega's x-manager x-assistant x-evolution-manager x-evolution-assistant "
+     "x-kaddressbook-x-managersname x-kaddressbook-x-assistantsname"},
+    {"neighbor",
+     "neighbor neighbors neighbour neighbours co-resident nachbar nachbarn voisin voisins vecino "
+     "vecinos vicino vicini buur buren"},
+    {"sweetheart", "sweetheart date crush muse"},
+    {"acquaintance", "acquaintance acquaintances contact met bekannte"},
+});
+
+/// Nothing for any other word: what is counted under a relationship never holds a text of the
+/// owner's.
+std::string_view relationshipOf(std::string_view word) {
+    static const auto table = [] {
+        std::unordered_map<std::string, std::string_view> made;
+        for (const auto& row : kRelations) {
+            for (auto& key : foldedWords(row.words)) made.emplace(std::move(key), row.relationship);
+        }
+        return made;
+    }();
+    const auto found = table.find(foldWord(word));
+    return found == table.end() ? std::string_view() : found->second;
+}
+
 /// One card while its lines are read.
 class Card {
   public:
@@ -61,6 +100,12 @@ class Card {
             if (!card_.position) card_.position = positionOf(cardText(line.text));
         } else if (line.name == "KIND" || line.name == "X-ADDRESSBOOKSERVER-KIND") {
             isPerson_ = foldWord(line.text) == "individual";
+        } else if (line.name == "CATEGORIES") {
+            addRelations(line.text, "");
+        } else if (line.name == "RELATED") {
+            addRelations(line.parameter("TYPE"), cardText(line.text));
+        } else {
+            addRelations(line.name, cardText(line.text));
         }
     }
 
@@ -69,6 +114,10 @@ class Card {
         if (!isPerson_) return std::nullopt;
         for (auto* name : {&formatted_, &structured_, &nickname_}) {
             if (card_.name.empty()) card_.name = std::move(*name);
+        }
+        // A category tells of the card's own person.
+        for (auto& relation : card_.relations) {
+            if (relation.name.empty()) relation.name = card_.name;
         }
         return std::move(card_);
     }
@@ -85,6 +134,23 @@ class Card {
             return;
         }
         handles.push_back(handle);
+    }
+
+    /// A relation to `name` for each of the words, which commas separate, that stands for one.
+    void addRelations(std::string_view words, std::string_view name) {
+        constexpr std::string_view kUuid = "urn:uuid:";
+        if (name.starts_with(kUuid)) name.remove_prefix(kUuid.size());
+        if (name.size() > limits::kLongestName) return;
+        while (!words.empty()) {
+            const auto end = std::min(words.find(','), words.size());
+            const auto relationship = relationshipOf(words.substr(0, end));
+            words.remove_prefix(std::min(end + 1, words.size()));
+            if (relationship.empty() || card_.relations.size() >= limits::kMostNames) continue;
+            CardRelation relation{std::string(relationship), std::string(name)};
+            if (std::ranges::find(card_.relations, relation) == card_.relations.end()) {
+                card_.relations.push_back(std::move(relation));
+            }
+        }
     }
 
     ContactCard card_;

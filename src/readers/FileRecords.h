@@ -32,6 +32,7 @@ struct PhotoRecord {
     std::vector<std::string> persons;     ///< Names, distinct.
     std::vector<std::string> holidays;
     std::vector<PublicEventRecord> publicEvents;
+    std::vector<std::string> keywords;  ///< Folded, words apart by blanks; distinct.
 
     friend bool operator==(const PhotoRecord&, const PhotoRecord&) = default;
 };

@@ -31,12 +31,21 @@ struct InteractionRecord {
     friend bool operator==(const InteractionRecord&, const InteractionRecord&) = default;
 };
 
+/// Somebody whom a card names with a word for a relationship; of another card only the UID.
+struct CardRelation {
+    std::string relationship;
+    std::string name;
+
+    friend bool operator==(const CardRelation&, const CardRelation&) = default;
+};
+
 /// One entry of an address book.
 struct ContactCard {
     std::string uid;   ///< Empty when the card has none.
     std::string name;  ///< For people; empty when the card has none.
     std::vector<std::string> handles;
     std::optional<GeoPoint> position;
+    std::vector<CardRelation> relations;
     /// Not a card: the name that a phone's own address book gave to a number of a backup.
     bool fromPhone = false;
 

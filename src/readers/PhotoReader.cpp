@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include <fmt/ranges.h>
+
 #include <algorithm>
 #include <string>
 #include <utility>
@@ -53,6 +55,8 @@ std::expected<FileRecords, std::string> readPhotoFile(int fd, const ReaderContex
         if (const auto holiday = holidayOfKeyword(keyword)) {
             addDistinct(photo.holidays, std::string(*holiday));
         }
+        addDistinct(photo.keywords,
+                    fmt::format("{}", fmt::join(foldedTokens(keyword, keyword.size()), " ")));
     }
     if (metadata->hasPetRegion) addDistinct(photo.inferences, std::string(kInferencePet));
     photo.persons = distinctNames(metadata->persons);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "readers/TextFolding.h"
+#include "folding/TextFolding.h"
 
 #include <unicode/normalizer2.h>
 #include <unicode/uchar.h>
@@ -81,6 +81,22 @@ std::string utf8Text(std::string_view bytes, const std::string& charset) {
     std::string utf8;
     text.toUTF8String(utf8);
     return utf8;
+}
+
+std::vector<std::string> foldedTokens(std::string_view text, std::size_t most) {
+    const auto isOfWord = [](char c) {
+        return (static_cast<unsigned char>(c) & 0x80U) != 0 || (c >= '0' && c <= '9') ||
+               (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z');
+    };
+    std::vector<std::string> tokens;
+    while (!text.empty() && tokens.size() < most) {
+        const auto* const end = std::ranges::find_if_not(text, isOfWord);
+        const auto length = static_cast<std::size_t>(end - text.begin());
+        auto key = foldWord(text.substr(0, length));
+        if (!key.empty()) tokens.push_back(std::move(key));
+        text.remove_prefix(std::min(length + 1, text.size()));
+    }
+    return tokens;
 }
 
 std::string cleanText(std::string_view bytes) {

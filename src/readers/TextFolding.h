@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -15,6 +16,10 @@ std::string foldWord(std::string_view utf8);
 
 /// The keys of words that stand apart by blanks (a blank within a word is written as a hyphen).
 std::vector<std::string> foldedWords(std::string_view words);
+
+/// The keys of the first `most` words of a text, in its order. They stand apart by whatever is in
+/// ASCII and neither a letter nor a digit.
+std::vector<std::string> foldedTokens(std::string_view text, std::size_t most);
 
 /// The text as valid UTF-8 without control characters and outer blanks. Bytes that are no UTF-8 are
 /// taken for windows-1252, which old cameras and editors write.

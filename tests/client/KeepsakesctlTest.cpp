@@ -154,6 +154,15 @@ TEST_F(KeepsakesctlTest, VisitsTellWhatThePlaceIsToTheOwner) {
                 HasSubstr("47.50000, -13.60000, work\n"));
 }
 
+TEST_F(KeepsakesctlTest, TopicsAreShownByTheirNamesTheStrongestFirst) {
+    const auto topic = samples::event(1);
+    topic->placeName.reset();
+    topic->scoredTopics = KSDictionary{
+        {"TFZX59DDWR22CqH8gMQt4Lw", 0.55}, {"TN5KR8Z7ESDORJr1QSxzJFA", 0.825}, {"Tother", 1}};
+    conduit_.setEvents({topic});
+    EXPECT_THAT(run("events").output, HasSubstr("Tother 1.00, Hiking 0.82, Food 0.55\n"));
+}
+
 TEST_F(KeepsakesctlTest, TheJsonFormIsStableAndGoesBackIn) {
     conduit_.setEvents({samples::fullEvent(1), samples::event(2)});
     const auto json = run("events --json");

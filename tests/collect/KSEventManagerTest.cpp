@@ -1,12 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "collect/KSEventManager.h"
 
+#include <fmt/format.h>
 #include <gmock/gmock.h>
 
 #include "StoreFixture.h"
 #include "model/KSExtensions.h"
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
+#include "sources/KSTopicManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
 #include "support/RecordedAssertions.h"
@@ -26,6 +28,7 @@ class Manager : public StoreFixture {
         universe->add("VitalsManager", KSVitalsManager::initWithUniverse(*universe));
         universe->add("NowPlayingMediaManager",
                       KSNowPlayingMediaManager::initWithUniverse(*universe));
+        universe->add("TopicManager", KSTopicManager::initWithUniverse(*universe));
         events = KSEventManager::initWithUniverse(*universe);
     }
 
@@ -149,6 +152,42 @@ TEST_F(Manager, MediaOfBothKindsAreTheirSourcesBusiness) {
     EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
               R"({"resultMusicSuccess": false, "resultNumberOfEvents": 0, )"
               R"("stateDatabaseAvailable": true})");
+}
+
+TEST_F(Manager, CollectsTopicsOfTheDayBeforeAndFillsThemIn) {
+    const std::string topic = "TN5KR8Z7ESDORJr1QSxzJFA";
+    platform.topics.scores = {{topic, 0.75}, {"other", 0.5}};
+    platform.defaults.values["com.brindle.keepsakesd/EventManagerEventCollectionStartDate"] =
+        now() - 864000;
+    for (const int count : {1, 0}) {
+        EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
+                  fmt::format(R"({{"resultNumberOfEvents": {}, "stateDatabaseAvailable": true}})",
+                              count));
+    }
+    KSEventArray filled;
+    events->fetchEventsWithOptions(
+        {}, [&filled](KSEventArray found, const OptionalError&) { filled = std::move(found); });
+    WorkerThreads::shared().settle();
+    ASSERT_EQ(filled.size(), 1u);
+    EXPECT_EQ(filled[0]->scoredTopics, (KSDictionary{{topic, 0.75}}));
+    EXPECT_EQ(filled[0]->startDate(), KSTopicManager::startOfDayBefore(now()));
+    EXPECT_EQ(filled[0]->endDate(), KSTopicManager::endOfDayBefore(now()));
+    platform.clock.step(86400);
+    platform.topics.nextError = KSError::make("Topics", 1, "broken");
+    EXPECT_EQ(run(&KSEventManager::collectEventsWithHandler).result,
+              R"({"resultNumberOfEvents": 0, "resultTopicsSuccess": false, )"
+              R"("stateDatabaseAvailable": true})");
+}
+
+TEST_F(Manager, CountsNearbyDevicesWithEachCollectionWhereTheOwnerWantsThat) {
+    run(&KSEventManager::collectEventsWithHandler);
+    platform.services.nearbyDevices = &platform.nearby;
+    events = KSEventManager::initWithUniverse(*universe);
+    platform.nearby.nextError = KSError::make("Radio", 1, "no radio");
+    const auto collected = run(&KSEventManager::collectEventsWithHandler).result;
+    EXPECT_EQ(collected, R"({"resultNumberOfEvents": 0, "stateDatabaseAvailable": true})");
+    run(&KSEventManager::cleanUpEventsWithHandler);
+    EXPECT_EQ(platform.nearby.asked, 1);
 }
 
 TEST_F(Manager, CleansWhatExpiredIsUnknownOrWasDeletedAtItsSource) {

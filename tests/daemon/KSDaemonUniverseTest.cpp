@@ -17,22 +17,22 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
     RecordedAssertions assertions;
     const KSDaemonUniverse universe(platform.services);
     EXPECT_THAT(assertions.take(), ElementsAre());
-    EXPECT_THAT(
-        universe.serviceNames(),
-        ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
-                    "PhotoManager", "RoutineServiceManager", "VitalsManager",
-                    "NowPlayingMediaManager", "SignificantContactManager", "DefaultsManager",
-                    "EventManager", "EventBundleManager", "Server", "DaemonClientNotifier",
-                    "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
-                    "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
-                    "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
+    EXPECT_THAT(universe.serviceNames(),
+                ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore",
+                            "EventStore", "PhotoManager", "RoutineServiceManager", "VitalsManager",
+                            "NowPlayingMediaManager", "SignificantContactManager", "TopicManager",
+                            "DefaultsManager", "EventManager", "EventBundleManager", "Server",
+                            "DaemonClientNotifier", "EventCollectionScheduler",
+                            "EventCollectionSchedulerNotifier", "EventComputeScheduler",
+                            "EventComputeSchedulerNotifier", "EventPurgeScheduler",
+                            "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;
         EXPECT_EQ(universe.getService(name), universe.getService(name));
     }
-    EXPECT_EQ(universe.getService("TopicManager"), nullptr);
+    EXPECT_EQ(universe.getService("DiscoveryManager"), nullptr);
     EXPECT_THAT(assertions.take(),
-                ElementsAre("No service named [TopicManager] (KSDaemonUniverse:133)"));
+                ElementsAre("No service named [DiscoveryManager] (KSDaemonUniverse:133)"));
 }
 
 TEST(KSDaemonUniverse, WithoutAnyFeatureItEndsAfterTenSeconds) {

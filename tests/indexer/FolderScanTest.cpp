@@ -128,8 +128,12 @@ TEST_F(FolderScan, ReadsWhatChangedAndForgetsWhatIsGone) {
 }
 
 TEST_F(FolderScan, DeletedRecordsAreNotFoundInTheFilesBytes) {
-    folder_.write("Pictures/a.jpg", "photo 100\nword beachball-word");
+    folder_.write("Pictures/a.jpg",
+                  "photo 100\nword beachball-word\nkeyword one\nkeyword beachball-word");
     scan();
+    EXPECT_EQ(
+        SQLite::Database(index_.string()).execAndGet("SELECT keywords FROM photos").getString(),
+        "one\nbeachball-word");
     fs::remove(photos_ / "a.jpg");
     scan();
     for (const char* suffix : {"", "-wal"}) {

@@ -144,6 +144,24 @@ class PeopleScan : public testing::Test {
     CountingReader reader_;
 };
 
+TEST_F(PeopleScan, KnowsRelatedPeopleAlsoByTheirOwnCards) {
+    folder_.write(
+        "Contacts/a.vcf",
+        card("Anna", "UID:urn:uuid:1\nRELATED;TYPE=spouse:urn:uuid:2\nCATEGORIES:Friends"));
+    folder_.write("Contacts/b.vcf",
+                  card("Bo", "UID:2\nRELATED;TYPE=friend:urn:uuid:1\nX-SPOUSE:Anna"));
+    const auto related = [this] {
+        scan();
+        return IndexedContactStore(index_).relatedPeople().value();
+    };
+    EXPECT_THAT(related(),
+                ElementsAre(RelatedPerson{"family", "Anna"}, RelatedPerson{"family", "Bo"},
+                            RelatedPerson{"friend", "Anna"}));
+    fs::remove(folder_ / "Contacts/b.vcf");
+    EXPECT_THAT(related(),
+                ElementsAre(RelatedPerson{"family", "2"}, RelatedPerson{"friend", "Anna"}));
+}
+
 TEST_F(PeopleScan, KnowsTheOwnerByWhatWasSentAndPeopleByTheirCards) {
     folder_.write("Mail/cur/1:2,S", mail(10, "Anna@x.org", "me@x.org, bo@x.org"));
     folder_.write("Mail/.Sent/cur/2:2,S", mail(11, "me@x.org", "anna@work.org"));

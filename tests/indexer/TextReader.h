@@ -14,7 +14,7 @@ namespace keepsakes {
 /// Reads what a test writes, a record a line:
 ///     workout START END ACTIVITY      photo TAKEN [LATITUDE LONGITUDE]
 ///     zone START END OFFSET           local TAKEN LOCAL          (a photo by the owner's zone)
-///     word WORD                       (an inference of the photo before)
+///     word WORD, keyword WORD         (an inference, a keyword of the photo before)
 ///     point TIME LATITUDE LONGITUDE       still FROM TO LATITUDE LONGITUDE    (a point a minute)
 ///     visit START END LATITUDE LONGITUDE [NAME]       place LATITUDE LONGITUDE NAME
 ///     broken REASON
@@ -58,6 +58,8 @@ class TextReader : public FileReader {
                 in >> zone.span.start.seconds >> zone.span.end.seconds >> zone.offsetSeconds;
             } else if (word == "word") {
                 in >> records.photos.back().inferences.emplace_back();
+            } else if (word == "keyword") {
+                in >> records.photos.back().keywords.emplace_back();
             } else if (word == "point" || word == "still") {
                 TrackPoint point;
                 in >> point.time.seconds;

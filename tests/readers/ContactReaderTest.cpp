@@ -36,6 +36,12 @@ TEST(ContactReader, ReadsCardsOfEveryVersion) {
          "card , Jo: \n"},
         {"an escape of nothing", "N:Doe;Jo\\\n", "card , Jo\\ Doe: \n"},
         {"a group is nobody", "FN:Choir\nKIND:group\nMEMBER:urn:uuid:1\n", ""},
+        {"related people",
+         "FN:A\nRELATED;TYPE=\"friend,colleague\";VALUE=text:Bo Muster\nCATEGORIES:Familie,Chor\n"
+         "RELATED;TYPE=Spouse:urn:uuid:u-1\nRELATED;TYPE=Zorro:Bo\nX-SPOUSE:Cy\\, the one\n"
+         "RELATED;TYPE=friend;VALUE=text:Bo Muster\nX-OTHER:friend\n",
+         "card , A: , friend Bo Muster, colleague Bo Muster, family A, family u-1, family Cy, the "
+         "one\n"},
         {"a picture", "FN:A\nPHOTO;ENCODING=b:" + std::string(200000, 'A') + "\nEMAIL:a@b\n",
          "card , A: mailto:a@b\n"},
     };

@@ -16,7 +16,7 @@ namespace keepsakes {
 
 /// Writes what a reader tells of people as one line a record:
 ///     <mechanism> <- or -> <start>[..<end>] <sender>: <recipients>
-///     card <uid>, <name>: <handles> [@ <latitude> <longitude>]
+///     card <uid>, <name>: <handles> [@ <latitude> <longitude>][, <relationship> <name>...]
 ///     owner <handle>
 class PeopleText final : public PeopleSink {
   public:
@@ -35,6 +35,9 @@ class PeopleText final : public PeopleSink {
             fmt::format("card {}, {}: {}", card.uid, card.name, fmt::join(card.handles, " "));
         if (card.position) {
             line += fmt::format(" @ {} {}", card.position->latitude, card.position->longitude);
+        }
+        for (const auto& relation : card.relations) {
+            line += fmt::format(", {} {}", relation.relationship, relation.name);
         }
         add(line);
     }

@@ -71,6 +71,16 @@ TEST_F(PhotoReader, TakesTheOffsetFromTheBestSource) {
     }
 }
 
+TEST_F(PhotoReader, KeepsItsKeywordsFoldedWithTheirWordsApart) {
+    auto metadata = taken();
+    metadata.xmp = bag("dc:subject", "Café–Bar am See, &amp; mehr") +
+                   bag("lr:hierarchicalSubject", "Freizeit|Trail_Running");
+    const auto records = readBytes(photo(metadata));
+    ASSERT_TRUE(records);
+    EXPECT_EQ(records->photos.at(0).keywords,
+              (std::vector<std::string>{"cafebar am see mehr", "freizeit", "trail running"}));
+}
+
 TEST_F(PhotoReader, ReadsEveryImageForm) {
     auto metadata = taken();
     metadata.latitude = "47/1 30/1 0/1";

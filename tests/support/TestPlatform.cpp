@@ -153,6 +153,24 @@ ContactStore::Contacts FakeContactStore::rankedContacts(
     return found;
 }
 
+std::expected<std::vector<RelatedPerson>, KSError> FakeContactStore::relatedPeople() {
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    return related;
+}
+
+NearbyDevices::Devices FakeNearbyDevices::devicesNear() {
+    ++asked;
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    return names;
+}
+
+TopicStore::Scores FakeTopicStore::scoresForTopicMapping(std::string_view mapping,
+                                                         const TopicQuery& query) {
+    asked.emplace_back(mapping, query);
+    if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
+    return scores;
+}
+
 void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
     const std::lock_guard lock(mutex_);
     sent_.emplace_back(event, fields);
@@ -260,6 +278,7 @@ TestPlatform::TestPlatform() {
     services.nowPlayingStream = &media;
     services.interactionStore = &interactions;
     services.contactStore = &contacts;
+    services.topicStore = &topics;
     services.deviceData = &deviceData;
     services.activities = &activities;
     services.problems = &problems;

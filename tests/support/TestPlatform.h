@@ -20,10 +20,12 @@
 #include "platform/HealthStore.h"
 #include "platform/InteractionStore.h"
 #include "platform/MediaStream.h"
+#include "platform/NearbyDevices.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
 #include "platform/RoutineService.h"
 #include "platform/SystemNotifications.h"
+#include "platform/TopicStore.h"
 #include "platform/UserDefaults.h"
 #include "support/FakeDeviceState.h"
 #include "support/TemporaryFolder.h"
@@ -127,7 +129,31 @@ class FakeContactStore final : public ContactStore {
     std::vector<RankedContact> contacts;
     std::optional<KSError> nextError;
 
+    std::vector<RelatedPerson> related;
+
     Contacts rankedContacts(std::span<const std::string> personIdentifiers) override;
+    std::expected<std::vector<RelatedPerson>, KSError> relatedPeople() override;
+};
+
+/// A radio in memory: knows devices, fails when told to, counts how often it was asked.
+class FakeNearbyDevices final : public NearbyDevices {
+  public:
+    std::vector<std::string> names;
+    std::optional<KSError> nextError;
+    int asked = 0;
+
+    Devices devicesNear() override;
+    void stop() override {}
+};
+
+/// A topic store in memory, likewise: the same scores for every interval.
+class FakeTopicStore final : public TopicStore {
+  public:
+    std::map<std::string, double> scores;
+    std::optional<KSError> nextError;
+    std::vector<std::pair<std::string, TopicQuery>> asked;
+
+    Scores scoresForTopicMapping(std::string_view mapping, const TopicQuery& query) override;
 };
 
 class FakeAnalytics final : public AnalyticsService {
@@ -192,6 +218,8 @@ struct TestPlatform {
     FakeNowPlayingStream media;
     FakeInteractionStore interactions;
     FakeContactStore contacts;
+    FakeTopicStore topics;
+    FakeNearbyDevices nearby;  ///< Not among the services until a test puts it there.
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
