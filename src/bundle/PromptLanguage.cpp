@@ -13,6 +13,7 @@
 #include "core/Text.h"
 #include "model/ContactSummary.h"
 #include "model/KSEventBundle.h"
+#include "model/TopicNames.h"
 #include "trends/TrendWords.h"
 #include "trends/TrendsKeys.h"
 
@@ -110,7 +111,8 @@ constexpr auto kRuleSubjects = std::to_array<Phrase>({
     {"HikingPlusPhotos", "mountain"},
 });
 
-/// What a cluster of nothing else but media is called.
+/// What a cluster of nothing else but topics, or media, is called.
+constexpr std::string_view kTopicSentence = "What the day was about";
 constexpr std::string_view kMediaSentence = "Watched or listened to";
 
 /// What a finding of an analysis is called.
@@ -189,6 +191,8 @@ bool isMedia(const KSEventPointer& event) {
            event->category() == KSEventCategory::leisureMedia;
 }
 
+bool hasTopics(const KSEventPointer& event) { return event->scoredTopics.has_value(); }
+
 /// An event that an analysis made.
 bool isTrend(const KSEventPointer& event) {
     return event->provider() == KSEventProvider::postAnalytics;
@@ -209,6 +213,7 @@ std::string_view headline(const KSEventBundle& bundle) {
         return sentence;
     }
     if (std::ranges::all_of(bundle.events, isMedia)) return kMediaSentence;
+    if (std::ranges::all_of(bundle.events, hasTopics)) return kTopicSentence;
     const bool workout = holds(bundle, KSEventCategory::workout);
     const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
     const bool visit = holds(bundle, KSEventCategory::visit);
@@ -231,6 +236,11 @@ std::vector<std::string> titles(const KSEventBundle& bundle) {
     std::vector<std::string> texts;
     for (const auto& event : bundle.events) {
         if (isTrend(event) && event->trends) addDistinct(texts, trendText(*event->trends));
+        if (event->scoredTopics) {
+            for (const auto& [name, score] : topicsByScore(*event->scoredTopics)) {
+                addDistinct(texts, name);
+            }
+        }
         addDistinct(texts, event->workoutType);
         addDistinct(texts, event->placeName);
         addDistinct(texts, event->tripTitle);

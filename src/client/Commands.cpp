@@ -15,6 +15,7 @@
 #include "core/Clock.h"
 #include "core/Json.h"
 #include "model/ContactSummary.h"
+#include "model/TopicNames.h"
 
 namespace keepsakes {
 
@@ -69,16 +70,10 @@ std::string playedText(double repetitions, double seconds) {
     return text + fmt::format("{} h {} min", minutes / 60, minutes % 60);
 }
 
-/// The strongest first.
 std::string topicsText(const KSDictionary& scoredTopics) {
-    std::vector<std::pair<double, std::string>> topics;
-    for (const auto& [name, score] : KSEvent::_displayNameOfScoredTopics(scoredTopics)) {
-        topics.emplace_back(-score.asNumber().value_or(0), name);
-    }
-    std::ranges::sort(topics);
     std::string text;
-    for (const auto& [negated, name] : topics) {
-        text += fmt::format("{}{} {:.2f}", text.empty() ? "" : ", ", name, -negated);
+    for (const auto& [name, score] : topicsByScore(scoredTopics)) {
+        text += fmt::format("{}{} {:.2f}", text.empty() ? "" : ", ", name, score);
     }
     return text;
 }

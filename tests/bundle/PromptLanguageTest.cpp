@@ -66,6 +66,12 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
                               KSDictionary{{"mechanism", 0}}}};
     EXPECT_EQ(prompt("SignificantContactInteraction", {contact}),
               "In touch with somebody close: Anna, Saturday 10:02 to 12:31, 2 messages and 1 call");
+    const auto topics = makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
+                                  KSEventCategory::topic);
+    topics->scoredTopics =
+        KSDictionary{{"TFZX59DDWR22CqH8gMQt4Lw", 0.6}, {"TN5KR8Z7ESDORJr1QSxzJFA", 0.8}};
+    EXPECT_EQ(prompt("", {topics}),
+              "What the day was about: Hiking, Food, Saturday 10:02 to 12:31");
     EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
                                     KSEventCategory::topic)}),
               "A moment: Saturday 10:02 to 12:31");
