@@ -23,7 +23,7 @@ KSDictionary archived(const Record& record) {
     return *jsonForm(KSValue(encoder.take())).asDictionary();
 }
 
-const KSDictionary& formOf(const KSDictionary& record) { return record; }
+KSDictionary formOf(const KSDictionary& record) { return record; }
 template <class Record>
 KSDictionary formOf(const std::shared_ptr<const Record>& record) {
     return jsonForm(*record);

@@ -54,7 +54,7 @@ void remember(SQLite::Database& database, const KnownGazetteer& gazetteer) {
 
 std::optional<std::string> takeTowns(SQLite::Database& database, int fd) {
     SQLite::Statement put(database, "INSERT INTO towns(latitude, longitude, name) VALUES(?, ?, ?)");
-    const auto read = readGazetteer(readDescriptor(fd), [&put](Town&& town) {
+    const auto read = readGazetteer(readDescriptor(fd), [&put](const Town& town) {
         put.reset();
         put.bind(1, town.position.latitude);
         put.bind(2, town.position.longitude);

@@ -75,7 +75,7 @@ bool readInterfaces(sd_bus_message* message, const char* path, Objects& objects)
     int entered = 0;
     while ((entered = sd_bus_message_enter_container(message, 'e', "sa{sv}")) > 0) {
         const char* name = nullptr;
-        if (sd_bus_message_read_basic(message, 's', &name) <= 0) return false;
+        if (sd_bus_message_read_basic(message, 's', static_cast<void*>(&name)) <= 0) return false;
         const std::string_view interface(name);
         bool isRead = true;
         if (interface == kDeviceInterface) {
@@ -96,7 +96,7 @@ bool readObjects(sd_bus_message* message, Objects& objects) {
     int entered = 0;
     while ((entered = sd_bus_message_enter_container(message, 'e', "oa{sa{sv}}")) > 0) {
         const char* path = nullptr;
-        if (sd_bus_message_read_basic(message, 'o', &path) <= 0 ||
+        if (sd_bus_message_read_basic(message, 'o', static_cast<void*>(&path)) <= 0 ||
             !readInterfaces(message, path, objects) || sd_bus_message_exit_container(message) < 0) {
             return false;
         }
@@ -141,8 +141,8 @@ NearbyDevices::Devices BluezDevices::devicesNear() {
         for (const auto& adapter : objects->poweredAdapters) {
             // One that cannot is none the less asked what it knows. The scan ends with the
             // connection.
-            static_cast<void>(
-                call(connection.get(), adapter.c_str(), kAdapterInterface, "StartDiscovery"));
+            [[maybe_unused]] const auto answer =
+                call(connection.get(), adapter.c_str(), kAdapterInterface, "StartDiscovery");
         }
         clock_.wait(stopped_, kScanSeconds);
         objects = readObjects(connection.get());

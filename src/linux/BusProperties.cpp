@@ -25,7 +25,7 @@ int readPath(sd_bus_message* message, const std::string& before, std::vector<std
     if (entered <= 0) return entered;
     const char* path = nullptr;
     if (sd_bus_message_skip(message, before.c_str()) < 0) return -1;
-    if (sd_bus_message_read_basic(message, 'o', &path) <= 0) return -1;
+    if (sd_bus_message_read_basic(message, 'o', static_cast<void*>(&path)) <= 0) return -1;
     if (paths.size() >= kMostPaths) return -1;
     if (view(path) != "/") paths.emplace_back(path);
     return sd_bus_message_exit_container(message) < 0 ? -1 : 1;
@@ -63,7 +63,7 @@ PropertyReader into(std::optional<double>& target) {
 PropertyReader into(std::optional<std::string>& target) {
     return [&target](sd_bus_message* message) {
         const char* read = nullptr;
-        if (sd_bus_message_read_basic(message, 's', &read) <= 0) return false;
+        if (sd_bus_message_read_basic(message, 's', static_cast<void*>(&read)) <= 0) return false;
         target = view(read);
         return target->size() <= kLongestText;
     };
@@ -91,7 +91,7 @@ bool readProperties(sd_bus_message* message, const PropertyReaders& readers) {
     int entered = 0;
     while ((entered = sd_bus_message_enter_container(message, 'e', "sv")) > 0) {
         const char* name = nullptr;
-        if (sd_bus_message_read_basic(message, 's', &name) <= 0) return false;
+        if (sd_bus_message_read_basic(message, 's', static_cast<void*>(&name)) <= 0) return false;
         const auto reader = readers.find(view(name));
         if (reader == readers.end()) {
             if (sd_bus_message_skip(message, "v") < 0) return false;
@@ -109,7 +109,7 @@ std::optional<std::vector<std::string>> readPaths(sd_bus_message* message, std::
     std::vector<std::string> paths;
     const char* path = nullptr;
     int read = 0;
-    while ((read = sd_bus_message_read_basic(message, 'o', &path)) > 0) {
+    while ((read = sd_bus_message_read_basic(message, 'o', static_cast<void*>(&path))) > 0) {
         if (paths.size() >= most) return std::nullopt;
         paths.emplace_back(path);
     }
@@ -122,7 +122,8 @@ bool tellsOfChange(sd_bus_message* signal, std::string_view interface,
     if (!sd_bus_message_is_signal(signal, kPropertiesInterface, "PropertiesChanged")) return false;
     if (sd_bus_message_rewind(signal, 1) < 0) return false;
     const char* named = nullptr;
-    if (sd_bus_message_read_basic(signal, 's', &named) <= 0 || view(named) != interface) {
+    if (sd_bus_message_read_basic(signal, 's', static_cast<void*>(&named)) <= 0 ||
+        view(named) != interface) {
         return false;
     }
     const auto isWanted = [&properties](const char* name) {
@@ -131,14 +132,14 @@ bool tellsOfChange(sd_bus_message* signal, std::string_view interface,
     const char* name = nullptr;
     if (sd_bus_message_enter_container(signal, 'a', "{sv}") <= 0) return false;
     while (sd_bus_message_enter_container(signal, 'e', "sv") > 0) {
-        if (sd_bus_message_read_basic(signal, 's', &name) <= 0) return false;
+        if (sd_bus_message_read_basic(signal, 's', static_cast<void*>(&name)) <= 0) return false;
         if (isWanted(name)) return true;
         if (sd_bus_message_skip(signal, "v") < 0) return false;
         if (sd_bus_message_exit_container(signal) < 0) return false;
     }
     if (sd_bus_message_exit_container(signal) < 0) return false;
     if (sd_bus_message_enter_container(signal, 'a', "s") <= 0) return false;
-    while (sd_bus_message_read_basic(signal, 's', &name) > 0) {
+    while (sd_bus_message_read_basic(signal, 's', static_cast<void*>(&name)) > 0) {
         if (isWanted(name)) return true;
     }
     return false;

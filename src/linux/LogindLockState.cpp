@@ -113,7 +113,7 @@ void LogindLockState::beginReading() {
         kPath, kManagerInterface, "GetSession", text(*owner_.session),
         [this](sd_bus_message* answer) {
             const char* path = nullptr;
-            if (sd_bus_message_read_basic(answer, 'o', &path) > 0) {
+            if (sd_bus_message_read_basic(answer, 'o', static_cast<void*>(&path)) > 0) {
                 readSession(path);
             } else {
                 reader_.fail("a session that makes no sense");
@@ -131,7 +131,7 @@ void LogindLockState::findUser() {
         },
         [this](sd_bus_message* answer) {
             const char* path = nullptr;
-            if (sd_bus_message_read_basic(answer, 'o', &path) > 0) {
+            if (sd_bus_message_read_basic(answer, 'o', static_cast<void*>(&path)) > 0) {
                 findSessions(path);
             } else {
                 reader_.fail("a user that makes no sense");

@@ -232,7 +232,7 @@ void MediaWatcher::Loop::onNames(sd_bus_message* message) {
     if (sd_bus_message_is_method_error(message, nullptr) > 0) return;
     if (sd_bus_message_enter_container(message, 'a', "s") <= 0) return;
     const char* name = nullptr;
-    while (sd_bus_message_read_basic(message, 's', &name) > 0) {
+    while (sd_bus_message_read_basic(message, 's', static_cast<void*>(&name)) > 0) {
         if (!view(name).starts_with(kNamePrefix)) continue;
         if (ownerCalls_.size() >= kMostPlayers) {
             full_ = true;
@@ -253,7 +253,7 @@ void MediaWatcher::Loop::onOwner(sd_bus_message* message) {
         const auto name = call->first;
         const char* owner = nullptr;
         if (sd_bus_message_is_method_error(message, nullptr) <= 0 &&
-            sd_bus_message_read_basic(message, 's', &owner) > 0) {
+            sd_bus_message_read_basic(message, 's', static_cast<void*>(&owner)) > 0) {
             addName(name, owner);
         }
         ownerCalls_.erase(call);
@@ -366,7 +366,7 @@ void MediaWatcher::Loop::onPropertiesChanged(Player& player, sd_bus_message* mes
     // Some say only that something changed, and want to be asked.
     if (player.asking || sd_bus_message_enter_container(message, 'a', "s") <= 0) return;
     const char* property = nullptr;
-    while (sd_bus_message_read_basic(message, 's', &property) > 0) {
+    while (sd_bus_message_read_basic(message, 's', static_cast<void*>(&property)) > 0) {
         if (view(property) != "Metadata" && view(property) != "PlaybackStatus") continue;
         loop.askState(player);
         return;

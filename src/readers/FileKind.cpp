@@ -70,9 +70,8 @@ class JsonHead final : public JsonHandler {
         if (depth_ == 1) {
             if (is(kHistoryRoots, name)) kind_ = FileKind::locationHistory;
             hasLocations_ = hasLocations_ || name == "locations";
-        } else if (depth_ == 2 && inArray_ && is(kSegmentParts, name)) {
-            kind_ = FileKind::locationHistory;
-        } else if (hasLocations_ && is(kRecordParts, name)) {
+        } else if ((depth_ == 2 && inArray_ && is(kSegmentParts, name)) ||
+                   (hasLocations_ && is(kRecordParts, name))) {
             kind_ = FileKind::locationHistory;
         }
     }
@@ -115,7 +114,7 @@ class JsonHead final : public JsonHandler {
 FileKind kindOfJson(std::string_view head) {
     JsonHead json;
     // Mostly an error, since the head ends anywhere; what came before it tells.
-    (void)readJson(head, json);
+    [[maybe_unused]] const auto error = readJson(head, json);
     return json.kind();
 }
 

@@ -18,9 +18,7 @@ namespace {
 /// The document's bytes, a block at a time. Ends early when reading fails or a token is too long.
 class JsonBytes {
   public:
-    explicit JsonBytes(const ReadBlock& read) : read_(read), buffer_(limits::kBlockSize) {
-        block_ = {buffer_.data(), 0};
-    }
+    explicit JsonBytes(const ReadBlock& read) : read_(read), buffer_(limits::kBlockSize) {}
     explicit JsonBytes(std::string_view document) : block_(document), ended_(true) {}
 
     bool atEnd() {

@@ -126,10 +126,8 @@ class ExifBlock {
     }
 
     std::optional<GeoPoint> position() const {
-        const auto latitude = degrees("Exif.GPSInfo.GPSLatitude", 'N', 'S');
-        const auto longitude = degrees("Exif.GPSInfo.GPSLongitude", 'E', 'W');
-        if (!latitude || !longitude) return std::nullopt;
-        return geoPoint(*latitude, *longitude);
+        return geoPoint(degrees("Exif.GPSInfo.GPSLatitude", 'N', 'S'),
+                        degrees("Exif.GPSInfo.GPSLongitude", 'E', 'W'));
     }
 
   private:
@@ -237,10 +235,7 @@ class XmpBlock {
     }
 
     std::optional<GeoPoint> position() const {
-        const auto latitude = xmpDegrees(latitude_, 'N', 'S');
-        const auto longitude = xmpDegrees(longitude_, 'E', 'W');
-        if (!latitude || !longitude) return std::nullopt;
-        return geoPoint(*latitude, *longitude);
+        return geoPoint(xmpDegrees(latitude_, 'N', 'S'), xmpDegrees(longitude_, 'E', 'W'));
     }
 
     /// Keywords, persons and events, added to what other blocks had.
