@@ -137,7 +137,7 @@ KSDaemonAnalyticsManager::DeviceStates KSDaemonAnalyticsManager::deviceStates() 
     return {stateOnCharger_, stateUnlocked_, optInDNU_, optInIHA_};
 }
 
-void KSDaemonAnalyticsManager::recordLaunch() {
+void KSDaemonAnalyticsManager::recordLaunch() const {
     const auto file = getDaemonPlistFileURL();
     auto history = readPersistenceTable(file);
     set(history, kLastLaunch, platform_.clock->now().seconds);

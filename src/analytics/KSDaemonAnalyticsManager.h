@@ -70,7 +70,7 @@ class KSDaemonAnalyticsManager final : public KSService {
     void listenTo(std::shared_ptr<KSNotifier> notifier,
                   std::initializer_list<std::int32_t> identifiers,
                   void (KSDaemonAnalyticsManager::*handler)(std::int32_t, const KSDictionary&));
-    void recordLaunch();
+    void recordLaunch() const;
     void onDeviceState(std::int32_t identifier, const KSDictionary& payload);
     void onWorkFinished(std::int32_t reasonIndex, const KSDictionary& payload);
     void addTriggerTimes(KSDictionary& payload, KSDictionary& history,

@@ -112,6 +112,7 @@ std::string textOf(const std::vector<TrendView>& views, const Screen& screen) {
 
 std::string jsonOf(const std::vector<TrendView>& views) {
     std::vector<KSDictionary> records;
+    records.reserve(views.size());
     for (const auto& view : views) records.push_back(view.json());
     return jsonRecords(records);
 }
