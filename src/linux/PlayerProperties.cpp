@@ -56,7 +56,8 @@ class Variant {
 
 std::string_view basicText(sd_bus_message* message, char type) {
     const char* text = nullptr;
-    return sd_bus_message_read_basic(message, type, &text) > 0 ? view(text) : "";
+    return sd_bus_message_read_basic(message, type, static_cast<void*>(&text)) > 0 ? view(text)
+                                                                                   : "";
 }
 
 /// Several texts, such as artists, as one.
