@@ -246,6 +246,7 @@ std::size_t KSMediaPlay::hash() const {
 
 std::string KSMediaPlay::description() const {
     std::vector<std::string> records;
+    records.reserve(events.size());
     for (const auto& record : events) records.push_back(describeRecord(record));
     return fmt::format(
         "<KSMediaPlay | title:{} album:{} bundleId:{} productId:{} genre:{} mediaType:{} "
