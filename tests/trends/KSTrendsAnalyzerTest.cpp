@@ -307,8 +307,8 @@ TEST_F(Analyzer, SendsAPayloadForEachTrendsEvent) {
     const auto ownersFields = [&](const KSTrendsAnalyzer& sender) {
         sender.sendMetricsForTrendsEvents({found});
         std::vector<std::string> keys;
-        const auto sent = platform.analytics.take();
-        for (const auto& [key, value] : sent.front().second) {
+        const auto payloads = platform.analytics.take();
+        for (const auto& [key, value] : payloads.front().second) {
             for (const char* owners : {"IHA_State", "Age", "Age_Bucketed", "BiologicalSex"}) {
                 if (key == owners) keys.push_back(key);
             }
