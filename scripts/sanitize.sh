@@ -15,7 +15,7 @@ case $preset in
         export UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1
         ;;
     tsan)
-        export TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1
+        export TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1:suppressions=$PWD/cmake/tsan.supp
         ;;
     *)
         echo "usage: scripts/sanitize.sh [asan|tsan] [CTEST ARGUMENT...]" >&2

@@ -56,6 +56,10 @@ class UPower : public testing::Test {
         heard.pop_front();
         return line;
     }
+    bool hearsNothing() {
+        const std::lock_guard lock(mutex);
+        return heard.empty();
+    }
     bool externalPowerChanges() { return clock.wait(externalChanges, kDeadlineSeconds); }
 
     void startUPower() {
@@ -157,7 +161,7 @@ TEST_F(UPower, TheLastStateOutlivesTheService) {
     upower.end();
     ASSERT_TRUE(clock.wait(end.seen, kDeadlineSeconds));
     WorkerThreads::shared().settle();
-    EXPECT_TRUE(heard.empty());
+    EXPECT_TRUE(hearsNothing());
     EXPECT_FALSE(power.hasExternalPower());
 
     upower.start();
