@@ -15,8 +15,12 @@ std::shared_ptr<KSDispatcher> KSDispatcher::initWithNotifier(std::shared_ptr<KSN
 
 void KSDispatcher::registerForNotification(std::int32_t identifier, Handler handler) {
     if (!handler) return;
-    if (!handlerMap_.emplace(identifier, std::move(handler)).second) return;
-    notifier_->registerDispatcher(shared_from_this(), identifier);
+    // On the notifier's queue, for an earlier handler may be hearing something right now.
+    bool isFirst = false;
+    notifier_->queue().sync([this, identifier, &handler, &isFirst] {
+        isFirst = handlerMap_.emplace(identifier, std::move(handler)).second;
+    });
+    if (isFirst) notifier_->registerDispatcher(shared_from_this(), identifier);
 }
 
 void KSDispatcher::unregisterForNotification(std::int32_t identifier) {

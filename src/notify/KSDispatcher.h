@@ -13,7 +13,7 @@ namespace keepsakes {
 class KSNotifier;
 
 /// A consumer's side of one notifier: a handler for each notification it cares for. Handlers run
-/// on the notifier's queue and hand long work on; they are registered before notifications flow.
+/// on the notifier's queue and hand long work on.
 /// While registered, notifier and dispatcher hold each other; the owner ends that with
 /// `invalidate`.
 class KSDispatcher final : public std::enable_shared_from_this<KSDispatcher> {
@@ -39,7 +39,7 @@ class KSDispatcher final : public std::enable_shared_from_this<KSDispatcher> {
     void onNotification(std::int32_t identifier, const KSValue& payload);
 
     const std::shared_ptr<KSNotifier> notifier_;
-    std::map<std::int32_t, Handler> handlerMap_;
+    std::map<std::int32_t, Handler> handlerMap_;  // only on its queue while attached
 };
 
 }  // namespace keepsakes
