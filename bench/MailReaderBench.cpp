@@ -30,6 +30,7 @@ const KSDate kNow = parseISO8601("2024-06-16")->date;
 class CountingSink final : public PeopleSink {
   public:
     void interaction(const InteractionRecord&) override { ++count; }
+    void link(const LinkRecord&) override {}
     void card(const ContactCard&) override {}
     void ownerHandle(const std::string&) override {}
     int count = 0;

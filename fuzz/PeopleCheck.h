@@ -27,6 +27,23 @@ class PeopleCheck final : public PeopleSink {
         for (const auto& handle : people) checkHandle(handle);
         interactions_.push_back(record);
     }
+    void link(const LinkRecord& link) override {
+        check(!interactions_.empty(), "a link stands in a message");
+        const auto& [url, title, description] = link.link;
+        check(url.starts_with("http://") || url.starts_with("https://"), "a link of the web");
+        check(url.size() <= limits::kLongestUrl, "a link of bounded length");
+        check(std::ranges::all_of(url, [](char c) { return c > ' ' && c < 0x7f; }),
+              "a link in ASCII");
+        for (const auto& text : {title, description, link.room, link.roomName}) {
+            check(text.size() <= 4 * limits::kLongestName, "words of bounded length");
+            check(std::ranges::none_of(text, [](char c) { return c == '\n' || c == '\0'; }),
+                  "words of one line");
+        }
+        LinkList again;
+        again.add(link.link);
+        check(again.links() == std::vector{link.link}, "a link in its own form");
+        links_.push_back(link);
+    }
     void card(const ContactCard& card) override {
         check(card.name.size() <= 4 * limits::kLongestName, "a name of bounded length");
         check(std::ranges::none_of(card.name, [](char c) { return c == '\n' || c == '\0'; }),
@@ -46,7 +63,8 @@ class PeopleCheck final : public PeopleSink {
     }
 
     friend bool operator==(const PeopleCheck& a, const PeopleCheck& b) {
-        return a.interactions_ == b.interactions_ && a.cards_ == b.cards_ && a.owner_ == b.owner_;
+        return a.interactions_ == b.interactions_ && a.links_ == b.links_ && a.cards_ == b.cards_ &&
+               a.owner_ == b.owner_;
     }
 
   private:
@@ -60,6 +78,7 @@ class PeopleCheck final : public PeopleSink {
     }
 
     std::vector<InteractionRecord> interactions_;
+    std::vector<LinkRecord> links_;
     std::vector<ContactCard> cards_;
     std::vector<std::string> owner_;
 };

@@ -8,7 +8,7 @@ set -euo pipefail
 declare -A packages=(
     [build]="ccache cmake g++ git libcli11-dev libexiv2-dev libexpat1-dev libfmt-dev libicu-dev libpugixml-dev
              libseccomp-dev libspdlog-dev libsqlite3-dev libsqlitecpp-dev libsystemd-dev
-             libtomlplusplus-dev nettle-dev ninja-build nlohmann-json3-dev pkg-config tzdata"
+             libtomlplusplus-dev libxml2-dev nettle-dev ninja-build nlohmann-json3-dev pkg-config tzdata"
     [test]="bash-completion binutils dbus dbus-daemon dbus-user-session libglib2.0-bin libgmock-dev libgtest-dev python3
             python3-dbus python3-dbusmock python3-gi python3-seccomp sqlite3 systemd"
     [lint]="clang-19 clang-format-14 clang-tidy-19 libclang-rt-19-dev"

@@ -13,6 +13,7 @@
 #include "core/Text.h"
 #include "model/ContactSummary.h"
 #include "model/KSEventBundle.h"
+#include "model/LinkSummary.h"
 #include "model/TopicNames.h"
 #include "trends/TrendWords.h"
 #include "trends/TrendsKeys.h"
@@ -115,6 +116,9 @@ constexpr auto kRuleSubjects = std::to_array<Phrase>({
 constexpr std::string_view kTopicSentence = "What the day was about";
 constexpr std::string_view kMediaSentence = "Watched or listened to";
 
+/// What a cluster of nothing else but links is called.
+constexpr std::string_view kLinksSentence = "Links shared with you";
+
 /// What a finding of an analysis is called.
 constexpr std::string_view kTrendSentence = "A trend";
 
@@ -141,6 +145,12 @@ std::string mediaText(const std::string& title, const std::string& artist, doubl
     auto text = artist.empty() ? title : fmt::format("{} by {}", title, artist);
     if (repetitions > 1) text += fmt::format(" ({:.0f} times)", repetitions);
     return text;
+}
+
+/// The title of a page stands in quotes, beside names of places and people.
+std::string linkText(const std::string& title, const std::string& origin) {
+    if (title.empty()) return {};
+    return origin.empty() ? fmt::format("\"{}\"", title) : fmt::format("\"{}\" {}", title, origin);
 }
 
 std::string peopleText(const std::vector<std::string>& names) {
@@ -193,6 +203,8 @@ bool isMedia(const KSEventPointer& event) {
 
 bool hasTopics(const KSEventPointer& event) { return event->scoredTopics.has_value(); }
 
+bool isLink(const KSEventPointer& event) { return event->category() == KSEventCategory::linkshelf; }
+
 /// An event that an analysis made.
 bool isTrend(const KSEventPointer& event) {
     return event->provider() == KSEventProvider::postAnalytics;
@@ -214,6 +226,7 @@ std::string_view headline(const KSEventBundle& bundle) {
     }
     if (std::ranges::all_of(bundle.events, isMedia)) return kMediaSentence;
     if (std::ranges::all_of(bundle.events, hasTopics)) return kTopicSentence;
+    if (std::ranges::all_of(bundle.events, isLink)) return kLinksSentence;
     const bool workout = holds(bundle, KSEventCategory::workout);
     const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
     const bool visit = holds(bundle, KSEventCategory::visit);
@@ -250,7 +263,7 @@ std::vector<std::string> titles(const KSEventBundle& bundle) {
                                          event->mediaRepetitions.value_or(0)));
         }
         addDistinct(texts, contactSummaryOf(*event).peopleText());
-        addDistinct(texts, event->itemLinkTitle ? event->itemLinkTitle : event->itemDisplayName);
+        addDistinct(texts, linkText(linkTitleOf(*event), linkOriginOf(*event)));
     }
     return texts;
 }

@@ -15,6 +15,7 @@
 #include "core/Clock.h"
 #include "core/Json.h"
 #include "model/ContactSummary.h"
+#include "model/LinkSummary.h"
 #include "model/TopicNames.h"
 
 namespace keepsakes {
@@ -95,7 +96,8 @@ std::string detailsOf(const KSEvent& event) {
     if (event.mediaSumTimePlayed) {
         add(playedText(event.mediaRepetitions.value_or(0), *event.mediaSumTimePlayed));
     }
-    add(event.itemDisplayName ? event.itemDisplayName : event.itemLinkTitle);
+    add(linkTitleOf(event));
+    add(linkOriginOf(event));
     if (event.category() == KSEventCategory::significantContact) {
         const auto contact = contactSummaryOf(event);
         add(contact.peopleText());

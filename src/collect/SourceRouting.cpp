@@ -3,6 +3,7 @@
 
 #include <utility>
 
+#include "sources/KSLinkshelfManager.h"
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
@@ -26,6 +27,7 @@ EventSources::EventSources(const ServiceLookup& universe)
       routineServiceManager_(universe.service<KSRoutineServiceManager>("RoutineServiceManager")),
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
       topicManager_(universe.service<KSTopicManager>("TopicManager")),
+      linkshelfManager_(universe.service<KSLinkshelfManager>("LinkshelfManager")),
       nowPlayingMediaManager_(universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")),
       significantContactManager_(
           universe.service<KSSignificantContactManager>("SignificantContactManager")) {
@@ -58,6 +60,13 @@ EventSources::EventSources(const ServiceLookup& universe)
                                   KSTopicManager::startOfDayBefore(end),
                                   KSTopicManager::endOfDayBefore(end), std::move(done));
                           }});
+    }
+    if (linkshelfManager_) {
+        steps_.push_back(
+            {"resultSharedSuccess",
+             [source = linkshelfManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveSharedContentBetweenStartDate(start, end, std::move(done));
+             }});
     }
     if (nowPlayingMediaManager_) {
         steps_.push_back(
@@ -98,6 +107,12 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
         case KSEventCategory::leisureMedia:
             if (nowPlayingMediaManager_) {
                 nowPlayingMediaManager_->removeMediaPlayEventsDeletedAtSource(group, handler);
+                return;
+            }
+            break;
+        case KSEventCategory::linkshelf:
+            if (linkshelfManager_) {
+                linkshelfManager_->removeSharedContentsDeletedAtSource(group, handler);
                 return;
             }
             break;
@@ -142,6 +157,12 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         case KSEventCategory::leisureMedia:
             if (nowPlayingMediaManager_) {
                 handler(nowPlayingMediaManager_->rehydratedMediaPlayEvents(group), std::nullopt);
+                return;
+            }
+            break;
+        case KSEventCategory::linkshelf:
+            if (linkshelfManager_) {
+                handler(linkshelfManager_->rehydratedSharedContentEvents(group), std::nullopt);
                 return;
             }
             break;

@@ -12,6 +12,7 @@
 
 namespace keepsakes {
 
+class KSLinkshelfManager;
 class KSNowPlayingMediaManager;
 class KSPhotoManager;
 class KSRoutineServiceManager;
@@ -51,6 +52,7 @@ class EventSources {
     std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
     std::shared_ptr<KSPhotoManager> photoManager_;
     std::shared_ptr<KSTopicManager> topicManager_;
+    std::shared_ptr<KSLinkshelfManager> linkshelfManager_;
     std::shared_ptr<KSNowPlayingMediaManager> nowPlayingMediaManager_;
     std::shared_ptr<KSSignificantContactManager> significantContactManager_;
     std::vector<CollectionStep> steps_;

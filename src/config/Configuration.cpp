@@ -136,6 +136,21 @@ Setter addresses(std::vector<std::string>& target) {
     };
 }
 
+Setter texts(std::vector<std::string>& target) {
+    return [&target](const toml::node& value, const Surroundings&) -> OptionalProblem {
+        const auto* array = value.as_array();
+        if (!array) return problemAt(value, "must be an array of strings");
+        std::vector<std::string> read;
+        for (const auto& item : *array) {
+            const auto text = item.value_exact<std::string>();
+            if (!text || text->empty()) return problemAt(item, "must hold strings only");
+            read.push_back(*text);
+        }
+        target = std::move(read);
+        return std::nullopt;
+    };
+}
+
 struct Key {
     std::string_view section;
     std::string_view name;
@@ -158,6 +173,7 @@ std::vector<Key> keysOf(Configuration& to) {
         {"owner", "date_of_birth", localDate(to.owner.dateOfBirth)},
         {"owner", "biological_sex", biologicalSex(to.owner.biologicalSex)},
         {"owner", "addresses", addresses(to.owner.addresses)},
+        {"links", "chats", texts(to.links.chats)},
         {"device", "content_protection", boolean(to.device.contentProtection)},
         {"activities", "collection", period(to.activities.collection)},
         {"activities", "compute", period(to.activities.compute)},

@@ -50,6 +50,11 @@ struct Configuration {
     } owner;
 
     struct {
+        /// Chats whose links are highlighted of themselves: addresses, or names of rooms.
+        std::vector<std::string> chats;
+    } links;
+
+    struct {
         bool contentProtection = false;
     } device;
 

@@ -13,6 +13,7 @@
 #include "devicedata/IndexedInteractionStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
 #include "devicedata/IndexedRoutineService.h"
+#include "devicedata/IndexedSearchIndex.h"
 #include "devicedata/IndexedTopicStore.h"
 #include "devicedata/MediaStreamFile.h"
 #include "linux/ActivityTimers.h"
@@ -128,6 +129,7 @@ struct DevicePorts::Adapters {
           routine(folders.cache / kIndexFile, *clock),
           interactions(folders.cache / kIndexFile),
           contacts(folders.cache / kIndexFile),
+          search(folders.cache / kIndexFile, configuration.links.chats),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
@@ -157,6 +159,7 @@ struct DevicePorts::Adapters {
     IndexedRoutineService routine;
     IndexedInteractionStore interactions;
     IndexedContactStore contacts;
+    IndexedSearchIndex search;
     IndexerProcess deviceData;
     ActivityTimers activities;
     MediaStreamFile media;
@@ -185,6 +188,7 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.contactStore = &adapters_->contacts;
     services_.topicStore = &adapters_->topics;
     services_.nearbyDevices = adapters_->nearby.get();
+    services_.searchIndex = &adapters_->search;
     services_.deviceData = &adapters_->deviceData;
     services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;

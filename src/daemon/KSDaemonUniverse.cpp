@@ -21,6 +21,7 @@
 #include "schedulers/KSEventComputeScheduler.h"
 #include "schedulers/KSEventPurgeScheduler.h"
 #include "service/KSManageServer.h"
+#include "sources/KSLinkshelfManager.h"
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
@@ -57,6 +58,7 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("PhotoManager", KSPhotoManager::initWithUniverse(*this));
     add("RoutineServiceManager", KSRoutineServiceManager::initWithUniverse(*this));
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
+    add("LinkshelfManager", KSLinkshelfManager::initWithUniverse(*this));
     add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
     add("SignificantContactManager", KSSignificantContactManager::initWithUniverse(*this));
     add("TopicManager", KSTopicManager::initWithUniverse(*this));

@@ -119,6 +119,7 @@ CREATE TABLE handles(
     person INTEGER,
     owner INTEGER NOT NULL DEFAULT 0);
 CREATE TABLE interactions(
+    id INTEGER PRIMARY KEY,
     file INTEGER NOT NULL,
     identity BLOB NOT NULL,
     start REAL NOT NULL,
@@ -129,6 +130,19 @@ CREATE TABLE interactions(
     recipients TEXT NOT NULL);
 CREATE INDEX interactionsByStart ON interactions(start);
 CREATE INDEX interactionsByFile ON interactions(file);
+CREATE TABLE links(
+    file INTEGER NOT NULL,
+    interaction INTEGER NOT NULL,
+    start REAL NOT NULL,
+    url TEXT NOT NULL,
+    title TEXT NOT NULL,
+    description TEXT NOT NULL,
+    room TEXT NOT NULL,
+    roomName TEXT NOT NULL,
+    account INTEGER,
+    starred INTEGER NOT NULL);
+CREATE INDEX linksByStart ON links(start);
+CREATE INDEX linksByFile ON links(file);
 CREATE TABLE cards(
     file INTEGER NOT NULL,
     uid TEXT NOT NULL,

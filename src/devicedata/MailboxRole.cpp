@@ -77,9 +77,9 @@ MailboxRole roleOfName(std::string_view name) {
 }
 
 /// The flags of a Maildir file's name, "unique:2,FLAGS" (cr.yp.to/proto/maildir.html).
-bool isFlaggedDraft(std::string_view name) {
+bool hasFlag(std::string_view name, char flag) {
     const auto info = name.rfind(":2,");
-    return info != std::string_view::npos && name.find('D', info + 3) != std::string_view::npos;
+    return info != std::string_view::npos && name.find(flag, info + 3) != std::string_view::npos;
 }
 
 }  // namespace
@@ -87,7 +87,7 @@ bool isFlaggedDraft(std::string_view name) {
 MailboxRole mailboxRole(std::string_view path) {
     auto slash = path.rfind('/');
     const auto name = path.substr(slash + 1);
-    if (isFlaggedDraft(name)) return MailboxRole::drafts;
+    if (hasFlag(name, 'D')) return MailboxRole::drafts;
     if (const auto role = roleOfName(name); role != MailboxRole::other) return role;
     // The folder, and when that is a part of a Maildir, the Maildir; beyond, a Gmail-like parent
     // such as "[Gmail]/Sent Mail" needs no more.
@@ -100,6 +100,10 @@ MailboxRole mailboxRole(std::string_view path) {
     }
     return MailboxRole::other;
 }
+
+bool isFlaggedMail(std::string_view name) { return hasFlag(name, 'F'); }
+
+bool isTrashedMail(std::string_view name) { return hasFlag(name, 'T'); }
 
 InteractionMechanism mechanismIn(MailboxRole role, InteractionMechanism mechanism) {
     if (mechanism != InteractionMechanism::mail) return mechanism;

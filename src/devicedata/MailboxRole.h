@@ -15,6 +15,10 @@ enum class MailboxRole : int { other = 0, sent = 1, drafts = 2, junk = 3 };
 /// English, German, French, Spanish, Italian or Dutch. A Maildir file flagged as a draft is one.
 MailboxRole mailboxRole(std::string_view path);
 
+/// Whether a Maildir file of this name is flagged as important to the owner, or as deleted.
+bool isFlaggedMail(std::string_view name);
+bool isTrashedMail(std::string_view name);
+
 /// The mechanism of a mail that lies in such a mailbox.
 InteractionMechanism mechanismIn(MailboxRole role, InteractionMechanism mechanism);
 

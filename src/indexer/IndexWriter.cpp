@@ -130,6 +130,7 @@ IndexWriter::Totals IndexWriter::totals() {
             .visits = count("SELECT count(*) FROM visits WHERE place IS NOT NULL"),
             .places = count("SELECT count(*) FROM places"),
             .interactions = count("SELECT count(*) FROM interactions"),
+            .links = count("SELECT count(*) FROM links"),
             .people = count("SELECT count(*) FROM people")};
 }
 
@@ -274,8 +275,9 @@ void IndexWriter::removeRecords(std::int64_t file) {
 void IndexWriter::removePeople(std::int64_t file) {
     begin();
     for (const char* text :
-         {"DELETE FROM interactions WHERE file = ?", "DELETE FROM cards WHERE file = ?",
-          "DELETE FROM relations WHERE file = ?", "DELETE FROM ownerHandles WHERE file = ?"}) {
+         {"DELETE FROM links WHERE file = ?", "DELETE FROM interactions WHERE file = ?",
+          "DELETE FROM cards WHERE file = ?", "DELETE FROM relations WHERE file = ?",
+          "DELETE FROM ownerHandles WHERE file = ?"}) {
         auto& remove = statement(text);
         remove.bind(1, file);
         if (remove.exec() == 0) continue;

@@ -65,6 +65,7 @@ class IndexWriter {
         std::uint64_t visits = 0;
         std::uint64_t places = 0;  ///< Locations of interest.
         std::uint64_t interactions = 0;
+        std::uint64_t links = 0;
         std::uint64_t people = 0;
     };
     Totals totals();

@@ -24,6 +24,9 @@ PeopleRows::PeopleRows(IndexWriter& index)
       addInteraction_(index.database(),
                       "INSERT INTO interactions(file, identity, start, end, mechanism, direction,"
                       " sender, recipients) VALUES(?, ?, ?, ?, ?, ?, ?, ?)"),
+      addLink_(index.database(),
+               "INSERT INTO links(file, interaction, start, url, title, description, room,"
+               " roomName, account, starred) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?)"),
       addCard_(index.database(),
                "INSERT INTO cards(file, uid, name, handles, fromPhone) VALUES(?, ?, ?, ?, ?)"),
       addRelation_(index.database(),
@@ -34,6 +37,7 @@ void PeopleRows::begin(std::int64_t file) {
     file_ = file;
     count_ = 0;
     failure_ = nullptr;
+    interaction_ = 0;
     index_.removePeople(file);
 }
 
@@ -61,6 +65,7 @@ void PeopleRows::changed() {
 }
 
 void PeopleRows::interaction(const InteractionRecord& record) {
+    interaction_ = 0;
     if (!std::isfinite(record.start.seconds) || !std::isfinite(record.end.seconds)) return;
     guarded([this, &record] {
         changed();
@@ -75,6 +80,28 @@ void PeopleRows::interaction(const InteractionRecord& record) {
         if (!record.sender.empty()) addInteraction_.bind(7, idOf(record.sender));
         addInteraction_.bindNoCopy(8, recipients);
         run(addInteraction_);
+        interaction_ = index_.database().getLastInsertRowid();
+        start_ = record.start;
+    });
+}
+
+void PeopleRows::link(const LinkRecord& link) {
+    if (interaction_ == 0) return;
+    guarded([this, &link] {
+        changed();
+        addLink_.clearBindings();
+        addLink_.bind(1, file_);
+        addLink_.bind(2, interaction_);
+        // Whole seconds, which the queries of a search index are written in.
+        addLink_.bind(3, std::floor(start_.seconds));
+        addLink_.bind(4, link.link.url);
+        addLink_.bind(5, link.link.title);
+        addLink_.bind(6, link.link.description);
+        addLink_.bind(7, link.room);
+        addLink_.bind(8, link.roomName);
+        if (!link.account.empty()) addLink_.bind(9, idOf(link.account));
+        addLink_.bind(10, link.isStarred ? 1 : 0);
+        run(addLink_);
     });
 }
 

@@ -26,6 +26,7 @@ class PeopleRows final : public PeopleSink {
     void finish();
 
     void interaction(const InteractionRecord& record) override;
+    void link(const LinkRecord& link) override;
     void card(const ContactCard& card) override;
     void ownerHandle(const std::string& handle) override;
 
@@ -40,6 +41,7 @@ class PeopleRows final : public PeopleSink {
     SQLite::Statement addHandle_;
     SQLite::Statement findHandle_;
     SQLite::Statement addInteraction_;
+    SQLite::Statement addLink_;
     SQLite::Statement addCard_;
     SQLite::Statement addRelation_;
     SQLite::Statement addOwner_;
@@ -47,6 +49,8 @@ class PeopleRows final : public PeopleSink {
     std::int64_t file_ = 0;
     std::uint64_t count_ = 0;
     std::exception_ptr failure_;
+    std::int64_t interaction_ = 0;  ///< That was told last; 0 when it was left out.
+    KSDate start_;                  ///< Its start.
 };
 
 }  // namespace keepsakes

@@ -75,6 +75,7 @@ class Update {
         use("SELECT sender, recipients FROM interactions");
         use("SELECT NULL, handles FROM cards");
         use("SELECT handle, '' FROM ownerHandles");
+        use("SELECT DISTINCT account, '' FROM links");
         Ids loose;
         SQLite::Statement all(database_, "SELECT id FROM handles");
         while (all.executeStep()) {

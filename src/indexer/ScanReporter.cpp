@@ -29,6 +29,7 @@ class JsonReporter final : public ScanReporter {
                                        {"visits", summary.totals.visits},
                                        {"places", summary.totals.places},
                                        {"interactions", summary.totals.interactions},
+                                       {"links", summary.totals.links},
                                        {"people", summary.totals.people},
                                        {"read", summary.read},
                                        {"renamed", summary.renamed},
@@ -63,9 +64,9 @@ class HumanReporter final : public ScanReporter {
         const auto& totals = summary.totals;
         fmt::print(
             "{} files known: {} workouts; {} visits to {} places; {} photos in {} occasions; {} "
-            "messages and calls; {} people; {} files refused.\n",
+            "messages and calls with {} links; {} people; {} files refused.\n",
             totals.files, totals.workouts, totals.visits, totals.places, totals.photos,
-            totals.occasions, totals.interactions, totals.people, totals.refused);
+            totals.occasions, totals.interactions, totals.links, totals.people, totals.refused);
         fmt::print("This scan read {} new or changed files, found {} moved and {} gone.\n",
                    summary.read, summary.renamed, summary.removed);
     }

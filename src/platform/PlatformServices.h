@@ -22,6 +22,7 @@ class PhotoAnalysis;
 class PowerSources;
 class Problems;
 class RoutineService;
+class SearchIndex;
 class SystemNotifications;
 class TopicStore;
 class UserDefaults;
@@ -54,6 +55,7 @@ struct PlatformServices {
     ContactStore* contactStore = nullptr;
     TopicStore* topicStore = nullptr;
     NearbyDevices* nearbyDevices = nullptr;
+    SearchIndex* searchIndex = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;

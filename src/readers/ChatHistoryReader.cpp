@@ -14,6 +14,7 @@
 #include "readers/FileReaders.h"
 #include "readers/Handles.h"
 #include "readers/ReaderLimits.h"
+#include "readers/TextFolding.h"
 
 namespace keepsakes {
 
@@ -103,12 +104,20 @@ class History {
     void read() {
         readOwner();
         readMembers();
+        const bool isAliased =
+            database_
+                .execAndGet(
+                    "SELECT count(*) FROM pragma_table_info('threads') WHERE name = 'alias'")
+                .getInt() > 0;
         SQLite::Statement query(
             database_,
-            "SELECT m.uid, m.time, m.direction, coalesce(m.status, 0), t.id, t.type, t.name,"
-            " a.protocol, coalesce(u.username, '') FROM messages m"
-            " JOIN threads t ON t.id = m.thread_id JOIN accounts a ON a.id = t.account_id"
-            " LEFT JOIN users u ON u.id = m.sender_id WHERE m.direction IN (1, -1)");
+            std::string("SELECT m.uid, m.time, m.direction, coalesce(m.status, 0), t.id, t.type,"
+                        " t.name, a.protocol, coalesce(u.username, ''), m.body, o.username, ") +
+                (isAliased ? "t.alias" : "''") +
+                " FROM messages m"
+                " JOIN threads t ON t.id = m.thread_id JOIN accounts a ON a.id = t.account_id"
+                " LEFT JOIN users o ON o.id = a.user_id"
+                " LEFT JOIN users u ON u.id = m.sender_id WHERE m.direction IN (1, -1)");
         while (query.executeStep()) message(query);
     }
 
@@ -176,6 +185,24 @@ class History {
             fmt::format("{}\n{}\n{}", row.getColumn(0).getString(), thread, date.seconds),
             kIdentitySeed);
         sink_.interaction(record);
+        links(row, isGroup ? thread : "");
+    }
+
+    void links(SQLite::Statement& row, const std::string& room) {
+        const auto body = row.getColumn(9).getString();
+        LinkList found;
+        findLinks(std::string_view(body).substr(0, limits::kLongestText), found);
+        for (const auto& link : found.links()) {
+            sink_.link({.link = link,
+                        .room = shortName(room),
+                        .roomName = room.empty() ? "" : shortName(row.getColumn(11).getString()),
+                        .account = handleOfUser(row.getColumn(10).getString(),
+                                                row.getColumn(7).getInt())});
+        }
+    }
+
+    static std::string shortName(const std::string& name) {
+        return name.size() > limits::kLongestName ? std::string() : cleanText(name);
     }
 
     SQLite::Database& database_;

@@ -189,7 +189,7 @@ void MailHeaders::take(Field field, std::string_view value) {
 void MailHeaders::clear() {
     for (auto& text : fields_) text.clear();
     current_ = nullptr;
-    isBulk_ = isAutomatic_ = isDraft_ = isDeleted_ = false;
+    isBulk_ = isAutomatic_ = isDraft_ = isDeleted_ = isStarred_ = false;
 }
 
 void MailHeaders::judge(std::string_view name, std::string_view value) {
@@ -210,12 +210,15 @@ void MailHeaders::judge(std::string_view name, std::string_view value) {
         isDraft_ = true;
     } else if (same(name, "x-mozilla-status")) {
         constexpr unsigned kExpunged = 0x0008;
+        constexpr unsigned kMarked = 0x0004;
         unsigned flags = 0;
         std::from_chars(value.data(), value.data() + value.size(), flags, 16);
         isDeleted_ |= (flags & kExpunged) != 0;
+        isStarred_ |= (flags & kMarked) != 0;
     } else if (same(name, "x-status")) {
         isDeleted_ |= value.find('D') != std::string_view::npos;
         isDraft_ |= value.find('T') != std::string_view::npos;
+        isStarred_ |= value.find('F') != std::string_view::npos;
     }
 }
 

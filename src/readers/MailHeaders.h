@@ -25,6 +25,8 @@ class MailHeaders {
 
     /// Marked as deleted by a program that leaves deleted mails in its mailbox.
     bool isDeleted() const { return isDeleted_; }
+    /// Marked as important to the owner by a program that keeps that in its mailbox.
+    bool isStarred() const { return isStarred_; }
 
   private:
     /// The fields that are kept.
@@ -40,6 +42,7 @@ class MailHeaders {
     bool isAutomatic_ = false;
     bool isDraft_ = false;
     bool isDeleted_ = false;
+    bool isStarred_ = false;
 };
 
 /// Whether the line begins with a field name and a colon.

@@ -6,14 +6,31 @@
 #include <utility>
 
 #include "readers/LineReader.h"
+#include "readers/MailBody.h"
 #include "readers/MailHeaders.h"
 
 namespace keepsakes {
+
+namespace {
+
+/// The links of the mail that was told last.
+void tellLinks(MailBody& body, bool isStarred, PeopleSink& sink) {
+    for (auto& link : body.takeLinks()) {
+        sink.link({.link = std::move(link),
+                   .room = {},
+                   .roomName = {},
+                   .account = {},
+                   .isStarred = isStarred});
+    }
+}
+
+}  // namespace
 
 std::expected<void, std::string> readMail(const ReadBlock& read, const ReaderContext& context,
                                           PeopleSink& sink) {
     LineReader lines(read);
     MailHeaders headers;
+    MailBody body;
     bool isWhole = false;  // Else the file was cut within its last field.
     for (std::string_view line;;) {
         const auto more = lines.next(line);
@@ -21,13 +38,22 @@ std::expected<void, std::string> readMail(const ReadBlock& read, const ReaderCon
         if (!*more) break;
         isWhole = lines.hasEnd();
         if (line.empty() || !isWhole) break;
-        if (!isMailSeparator(line)) headers.line(line);
+        if (isMailSeparator(line)) continue;
+        headers.line(line);
+        body.headerLine(line);
     }
     if (!isWhole) return std::unexpected("the mail's header is cut");
     if (headers.isDeleted()) return {};
     const auto record = headers.record(context.now);
     if (!record) return std::unexpected(record.error());
     sink.interaction(*record);
+    for (std::string_view line; body.wantsMore();) {
+        const auto more = lines.next(line);
+        if (!more) return std::unexpected(more.error());
+        if (!*more) break;
+        body.line(line);
+    }
+    tellLinks(body, headers.isStarred(), sink);
     return {};
 }
 
@@ -41,9 +67,10 @@ class Mailbox {
     void line(std::string_view line) {
         if (std::exchange(isSeparated_, false)) {
             if (isHeaderLine(line)) {
+                endMail();
                 headers_.clear();
                 part_ = Part::header;
-                headers_.line(line);
+                header(line);
                 return;
             }
             part_ = part_ == Part::start ? Part::body : part_;
@@ -51,18 +78,21 @@ class Mailbox {
         // A separator follows an empty line; programs that are careless of it end headers with one.
         isSeparated_ = (wasEmpty_ || part_ != Part::body) && isMailSeparator(line);
         wasEmpty_ = line.empty();
-        if (part_ != Part::header || isSeparated_) return;
+        if (isSeparated_) return;
+        if (part_ == Part::body && isTaken_) body_.line(line);
+        if (part_ != Part::header) return;
         if (line.empty()) {
             take();
             part_ = Part::body;
         } else {
-            headers_.line(line);
+            header(line);
         }
     }
 
     /// What the file held, when it held anything that can be read.
     std::expected<void, std::string> finish(bool isWhole) {
         if (part_ == Part::header && isWhole) take();
+        endMail();
         if (taken_ == 0 && reason_) {
             return std::unexpected(fmt::format("no mail of it can be read: {}", *reason_));
         }
@@ -72,10 +102,25 @@ class Mailbox {
   private:
     enum class Part { start, header, body };
 
+    void header(std::string_view line) {
+        headers_.line(line);
+        body_.headerLine(line);
+    }
+
+    /// Tells the links of the mail that ends.
+    void endMail() {
+        if (std::exchange(isTaken_, false)) {
+            tellLinks(body_, headers_.isStarred(), sink_);
+        } else {
+            body_ = {};
+        }
+    }
+
     void take() {
         if (headers_.isDeleted()) return;
         if (const auto record = headers_.record(context_.now)) {
             sink_.interaction(*record);
+            isTaken_ = true;
             ++taken_;
         } else if (!reason_) {
             reason_ = record.error();
@@ -85,6 +130,8 @@ class Mailbox {
     const ReaderContext& context_;
     PeopleSink& sink_;
     MailHeaders headers_;
+    MailBody body_;
+    bool isTaken_ = false;  ///< The mail was told, and its links may follow.
     Part part_ = Part::start;
     bool isSeparated_ = false;  ///< The line before was a separator, if a header follows it.
     bool wasEmpty_ = true;

@@ -7,7 +7,7 @@
 namespace keepsakes {
 
 /// `readMailFile` and `readMailboxFile`, from any source of bytes. Of a mail that stands alone
-/// nothing behind the header is read.
+/// no more than `limits::kLongestMail` behind the header is read.
 std::expected<void, std::string> readMail(const ReadBlock& read, const ReaderContext& context,
                                           PeopleSink& sink);
 std::expected<void, std::string> readMailbox(const ReadBlock& read, const ReaderContext& context,

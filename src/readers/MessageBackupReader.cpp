@@ -82,6 +82,7 @@ class Backup final : public XmlHandler {
         if (depth_ == 2 && name == "mms") startMms(attributes);
         if (depth_ == 2 && name == "call") call(attributes);
         if (name == "addr" && mms_) addAddress(attributes);
+        if (name == "part" && mms_) addLinks(attributes, "text", mms_->links);
     }
 
     void endElement() override {
@@ -110,6 +111,8 @@ class Backup final : public XmlHandler {
         std::string contact;
         std::vector<std::string> participants;
         std::string from;
+        bool isStarred = false;
+        LinkList links;
     };
 
     std::optional<KSDate> dateOf(XmlAttributes attributes) {
@@ -142,7 +145,10 @@ class Backup final : public XmlHandler {
         }
         learn(people, textOf(attributes, "contact_name"));
         direct(record, box, people, people.empty() ? "" : people.front());
+        LinkList links;
+        addLinks(attributes, "body", links);
         finish(record, fmt::format("sms {} {} {}", date->seconds, address, box));
+        tell(links, isLocked(attributes));
     }
 
     void startMms(XmlAttributes attributes) {
@@ -156,7 +162,9 @@ class Backup final : public XmlHandler {
                    .address = textOf(attributes, "address"),
                    .contact = textOf(attributes, "contact_name"),
                    .participants = {},
-                   .from = {}};
+                   .from = {},
+                   .isStarred = isLocked(attributes),
+                   .links = {}};
     }
 
     void addAddress(XmlAttributes attributes) {
@@ -187,6 +195,24 @@ class Backup final : public XmlHandler {
         direct(record, mms.box, people, sender);
         finish(record, fmt::format("mms {} {} {} {}", mms.date.seconds, mms.address, mms.box,
                                    mms.identity));
+        tell(mms.links, mms.isStarred);
+    }
+
+    /// "Locked" keeps a message from being deleted: the one mark that the format has.
+    static bool isLocked(XmlAttributes attributes) {
+        return numberOf<int>(attributes, "locked").value_or(0) != 0;
+    }
+
+    /// Of the text, the filter leaves the links.
+    static void addLinks(XmlAttributes attributes, std::string_view name, LinkList& links) {
+        findLinks(attributes.find(name).value_or(""), links);
+    }
+
+    void tell(const LinkList& links, bool isStarred) {
+        for (const auto& link : links.links()) {
+            sink_.link(
+                {.link = link, .room = {}, .roomName = {}, .account = {}, .isStarred = isStarred});
+        }
     }
 
     void call(XmlAttributes attributes) {
@@ -258,7 +284,7 @@ class Backup final : public XmlHandler {
 std::expected<void, std::string> readMessageBackup(const ReadBlock& read,
                                                    const ReaderContext& context, PeopleSink& sink) {
     Backup backup(context, sink);
-    const auto filtered = withoutAttributes(read, {"body", "data", "subject", "sub", "text"});
+    const auto filtered = withoutAttributes(read, {"data", "subject", "sub"}, {"body", "text"});
     if (auto done = readXml(filtered, backup); !done) return done;
     return backup.finish();
 }

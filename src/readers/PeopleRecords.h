@@ -10,6 +10,7 @@
 #include "core/KSDate.h"
 #include "platform/InteractionStore.h"
 #include "readers/FileRecords.h"
+#include "readers/LinkFinder.h"
 
 namespace keepsakes {
 
@@ -29,6 +30,19 @@ struct InteractionRecord {
     std::vector<std::string> recipients;
 
     friend bool operator==(const InteractionRecord&, const InteractionRecord&) = default;
+};
+
+/// One link of a message.
+struct LinkRecord {
+    FoundLink link;
+    /// The room that it was shared in, by its identifier and its name; empty outside of rooms.
+    std::string room;
+    std::string roomName;
+    /// The owner's own address that the message came to or from; empty where that is not told.
+    std::string account;
+    bool isStarred = false;  ///< The owner marked the message, in the file itself.
+
+    friend bool operator==(const LinkRecord&, const LinkRecord&) = default;
 };
 
 /// Somebody whom a card names with a word for a relationship; of another card only the UID.
@@ -59,6 +73,8 @@ class PeopleSink {
   public:
     virtual ~PeopleSink() = default;
     virtual void interaction(const InteractionRecord& record) = 0;
+    /// Of the interaction told last.
+    virtual void link(const LinkRecord& link) = 0;
     virtual void card(const ContactCard& card) = 0;
     /// A number or address that the file shows to be the owner's own.
     virtual void ownerHandle(const std::string& handle) = 0;

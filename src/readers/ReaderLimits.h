@@ -87,6 +87,12 @@ inline constexpr std::size_t kMostCards = 100000;
 inline constexpr std::size_t kMostHandles = 100;
 /// A call lasts a day at most, in seconds.
 inline constexpr double kLongestCall = 86400;
+/// Links of one message, and bytes of one: what is longer is no link that somebody meant to share.
+inline constexpr std::size_t kMostLinks = 16;
+inline constexpr std::size_t kLongestUrl = 2048;
+/// Bytes of a message's text that are searched for links, and of a mail behind its header.
+inline constexpr std::size_t kLongestText = std::size_t{256} * 1024;
+inline constexpr std::size_t kLongestMail = std::size_t{1024} * 1024;
 /// Bytes of a messenger's database with its log: it is copied into memory.
 inline constexpr std::uint64_t kLargestChatHistory = std::uint64_t{256} * 1024 * 1024;
 

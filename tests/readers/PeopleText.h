@@ -16,6 +16,7 @@ namespace keepsakes {
 
 /// Writes what a reader tells of people as one line a record:
 ///     <mechanism> <- or -> <start>[..<end>] <sender>: <recipients>
+///     link <url>[ | <title>][ | <description>][ | <room>][ | <room's name>][ | <account>][ *]
 ///     card <uid>, <name>: <handles> [@ <latitude> <longitude>][, <relationship> <name>...]
 ///     owner <handle>
 class PeopleText final : public PeopleSink {
@@ -29,6 +30,14 @@ class PeopleText final : public PeopleSink {
                         formatISO8601(record.start), end, record.sender,
                         fmt::join(record.recipients, " ")));
         identities.push_back(record.identity);
+    }
+    void link(const LinkRecord& record) override {
+        auto line = "link " + record.link.url;
+        for (const auto& part : {record.link.title, record.link.description, record.room,
+                                 record.roomName, record.account}) {
+            if (!part.empty()) line += " | " + part;
+        }
+        add(line + (record.isStarred ? " *" : ""));
     }
     void card(const ContactCard& card) override {
         auto line =

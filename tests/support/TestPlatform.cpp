@@ -171,6 +171,19 @@ TopicStore::Scores FakeTopicStore::scoresForTopicMapping(std::string_view mappin
     return scores;
 }
 
+void FakeSearchIndex::start(const SearchQuery& query, const FoundItems& found,
+                            const Completion& completion) {
+    asked.push_back(query);
+    const bool isOfChats = query.queryString.starts_with(searchkey::kIsChatAutoDonating);
+    if (nextError && !isOfChats) {
+        completion(std::exchange(nextError, std::nullopt));
+        return;
+    }
+    // One by one: whoever asks has to put the batches together.
+    for (const auto& item : isOfChats ? donatingChats : items) found(std::span(&item, 1));
+    completion(std::nullopt);
+}
+
 void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
     const std::lock_guard lock(mutex_);
     sent_.emplace_back(event, fields);
@@ -279,6 +292,7 @@ TestPlatform::TestPlatform() {
     services.interactionStore = &interactions;
     services.contactStore = &contacts;
     services.topicStore = &topics;
+    services.searchIndex = &search;
     services.deviceData = &deviceData;
     services.activities = &activities;
     services.problems = &problems;

@@ -24,6 +24,7 @@
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
 #include "platform/RoutineService.h"
+#include "platform/SearchIndex.h"
 #include "platform/SystemNotifications.h"
 #include "platform/TopicStore.h"
 #include "platform/UserDefaults.h"
@@ -156,6 +157,19 @@ class FakeTopicStore final : public TopicStore {
     Scores scoresForTopicMapping(std::string_view mapping, const TopicQuery& query) override;
 };
 
+/// A search index in memory: answers every query with its items, those of chats apart; fails when
+/// told to, tells what it was asked.
+class FakeSearchIndex final : public SearchIndex {
+  public:
+    std::vector<SearchableItem> items;
+    std::vector<SearchableItem> donatingChats;
+    std::optional<KSError> nextError;
+    std::vector<SearchQuery> asked;
+
+    void start(const SearchQuery& query, const FoundItems& found,
+               const Completion& completion) override;
+};
+
 class FakeAnalytics final : public AnalyticsService {
   public:
     void send(std::string_view event, const KSDictionary& fields) override;
@@ -220,6 +234,7 @@ struct TestPlatform {
     FakeContactStore contacts;
     FakeTopicStore topics;
     FakeNearbyDevices nearby;  ///< Not among the services until a test puts it there.
+    FakeSearchIndex search;
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
