@@ -23,10 +23,19 @@ constexpr std::string_view kSeeds[] = {
     "Date: Fri, 14 Jun 2024 08:00:00 +0200\nMessage-ID: <1@x>\n\ntext\n\nFrom b 14 Jun 08:00 2024\n"
     "From: b@x.org\nDate: 14 Jun 24 08:00 EST\nList-Id: x\n\n",
     "Received: x\n y\nFrom: a@x.org\nDate: 14 Jun 2024 08:00:00 Z\nCc: b@x.org, c@x.org\n\n",
-    "<smses><sms address='+436605551234' date='1718344800000' type='1' body='&#55357;'"
+    "<smses><sms address='+436605551234' date='1718344800000' type='1' "
+    "body='&#55357;http://x.org/&amp;&#39;'"
     " contact_name='A'/><mms msg_box='2' date='1718344800000' address='111111111~222222222'><addrs>"
     "<addr address='333333333' type='137'/></addrs></mms><call number='111111111' type='1'"
     " duration='5' date='1718344800000'/></smses>",
+    "From b 14 Jun 08:00 2024\nFrom: a@x.org\nDate: 14 Jun 2024 08:00:00 Z\nContent-Type: "
+    "multipart/mixed; "
+    "boundary=b\n\n--b\n"
+    "\nhttp://x.org/a).\n--b\nContent-Type: text/html; charset=utf-8\n"
+    "Content-Transfer-Encoding: quoted-printable\n\n<blockquote></blockquote><a "
+    "href=3D\"http://x.or=\n"
+    "g\">T&auml;g<img alt=3D'x'></a>\n--b\nContent-Transfer-Encoding: "
+    "base64\n\naHR0cDovL3gu\n--b--\n",
 };
 
 std::expected<void, std::string> read(int kind, const ReadBlock& bytes, PeopleSink& sink) {

@@ -173,6 +173,7 @@ step() {
 echo "It is $now for the daemon, which looks back a week."
 "$bin/keepsakesctl" defaults write com.brindle.keepsakesd EventManagerEventCollectionStartDate \
     "$(date -d "$now - 7 days" +%FT%T%:z)"
+"$bin/keepsakesctl" defaults write com.brindle.Sharelane LinkshelfEnabled true
 step collect
 step bundle
 step events

@@ -17,7 +17,8 @@ The owner lives in Graz (Europe/Vienna, UTC+2 that week):
   Saturday   a hike (GPX), with photos
 and what she listened to that week, as records of the now-playing stream (CSV);
 and, in the weeks before and during that one, text messages and calls with Anna Beispiel (an Android
-backup), mails with Jakob Muster (a Maildir), a newsletter, and an address book that knows both;
+backup), mails with Jakob Muster (a Maildir), a newsletter, and an address book that knows both; a link in
+one of the messages and in one of the mails, which the owner marked;
 and two files that cannot be read: a GPX file cut in the middle, a photo without a date.
 """
 
@@ -411,6 +412,11 @@ TEXTS = [
     ("2024-06-15 19:52:39", 2),
 ]
 
+# A link that Anna sent in her twelfth message, which the owner locked, and one in Jakob's tenth
+# mail, which the owner flagged.
+LINK_IN_TEXT = (12, "https://example.com/konzert?karten=2")
+LINK_IN_MAIL = (10, "https://example.org/touren/rettenbachklamm", "Durch die Rettenbachklamm")
+
 # local time, seconds, 1 incoming, 2 outgoing or 3 missed
 CALLS = [("2024-06-08 17:20:00", 611, 2), ("2024-06-14 18:40:10", 0, 3),
          ("2024-06-14 18:42:00", 184, 2)]
@@ -437,10 +443,14 @@ def android_backup(root, entries):
 
 def make_messages(folder):
     folder.mkdir(parents=True, exist_ok=True)
+    def body(number):
+        return f"Schau: {LINK_IN_TEXT[1]}" if number == LINK_IN_TEXT[0] else f"Nachricht {number}"
+
     texts = [
         f'  <sms protocol="0" address="{ANNA}" date="{milliseconds(local)}" type="{kind}"'
-        f' subject="null" body="Nachricht {number}" read="1" status="-1"'
-        f' contact_name="Anna Beispiel" />'
+        f' subject="null" body="{body(number)}" read="1" status="-1"'
+        + (' locked="1"' if number == LINK_IN_TEXT[0] else "")
+        + ' contact_name="Anna Beispiel" />'
         for number, (local, kind) in enumerate(TEXTS, start=1)
     ]
     texts.append(f'  <sms protocol="0" address="Paketdienst" date="{milliseconds("2024-06-13 10:00:00")}"'
@@ -462,9 +472,13 @@ def make_mails(folder):
         sender, recipient = (OWNER, JAKOB) if is_sent else (JAKOB, OWNER)
         time = utc(local).strftime("%a, %d %b %Y %H:%M:%S +0200")
         place = ".Sent/cur" if is_sent else "cur"
-        (folder / place / f"{number}.sample:2,S").write_text(
+        flags, kind, text = "S", "", f"Text {number}."
+        if number == LINK_IN_MAIL[0]:
+            flags, kind = "FS", "Content-Type: text/html; charset=utf-8\n"
+            text = f'<p>Morgen: <a href="{LINK_IN_MAIL[1]}">{LINK_IN_MAIL[2]}</a></p>'
+        (folder / place / f"{number}.sample:2,{flags}").write_text(
             f"From: {sender}\nTo: {recipient}\nDate: {time}\nMessage-ID: <{number}@example.org>\n"
-            f"Subject: {subject}\n\nText {number}.\n")
+            f"Subject: {subject}\n{kind}\n{text}\n")
     (folder / "cur" / "99.sample:2,").write_text(
         "From: Bergwetter <news@example.com>\nTo: ich@example.org\n"
         "Date: Fri, 14 Jun 2024 06:00:00 +0000\nMessage-ID: <news-24@example.com>\n"

@@ -55,6 +55,7 @@ class ContactPlaces final : public PeopleSink {
   public:
     ContactPlaces(PeopleSink& people, LocationSink& places) : people_(people), places_(places) {}
     void interaction(const InteractionRecord& record) override { people_.interaction(record); }
+    void link(const LinkRecord& link) override { people_.link(link); }
     void card(const ContactCard& card) override {
         people_.card(card);
         if (!card.position || card.name.empty()) return;

@@ -2,9 +2,10 @@
 #include <libxml/HTMLparser.h>
 
 #include <memory>
+#include <new>
 #include <optional>
+#include <utility>
 
-#include "core/Text.h"
 #include "readers/LinkFinder.h"
 #include "readers/ReaderLimits.h"
 #include "readers/TextFolding.h"
@@ -20,11 +21,12 @@ std::string_view textOf(const xmlChar* bytes) {
 /// One line without more blanks than one between words, cut to the length of a name.
 std::string oneLine(std::string_view text) {
     std::string line;
-    for (const char c : cleanText(text)) {
+    for (const char c : text) {
         const bool isBlank = c == ' ' || c == '\t' || c == '\r' || c == '\n';
         if (isBlank && (line.empty() || line.back() == ' ')) continue;
         line += isBlank ? ' ' : c;
     }
+    line = cleanText(line);
     if (line.size() > limits::kLongestName) {
         auto end = limits::kLongestName;
         while (end > 0 && (static_cast<unsigned char>(line[end]) & 0xC0U) == 0x80U) --end;

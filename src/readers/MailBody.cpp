@@ -37,6 +37,13 @@ int base64Digit(char c) {
     return c == '/' ? 63 : -1;
 }
 
+/// A line of underscores, behind which mailing lists put their address, and other programs the mail
+/// that is answered.
+bool isRule(std::string_view line) {
+    constexpr std::size_t kShortestRule = 20;
+    return line.size() >= kShortestRule && line.find_first_not_of('_') == std::string_view::npos;
+}
+
 }  // namespace
 
 void MailBody::Header::line(std::string_view line) {
@@ -46,6 +53,8 @@ void MailBody::Header::line(std::string_view line) {
     }
     current_ = nullptr;
     const auto colon = line.find(':');
+    // All three begin so; most fields of a mail do not.
+    if (!line.starts_with('C') && !line.starts_with('c')) return;
     if (colon == std::string_view::npos || colon > limits::kLongestValue) return;
     const auto name = lowerCased(trimmed(line.substr(0, colon)));
     auto* const field = name == "content-type"                ? &type_
@@ -182,7 +191,7 @@ void MailBody::findInPlain(std::string_view text) {
         auto line = text.substr(0, end);
         text.remove_prefix(std::min(end + 1, text.size()));
         if (line.ends_with('\r')) line.remove_suffix(1);
-        if (line == "-- ") return;
+        if (line == "-- " || isRule(line)) return;
         if (!line.starts_with('>')) findLinks(line, links_);
     }
 }

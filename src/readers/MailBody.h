@@ -13,7 +13,7 @@ namespace keepsakes {
 
 /// Finds the links in the text parts of one mail (RFC 2045 and 2046), line by line and in bounded
 /// memory; nothing else of the text is kept. What is attached, what a reply quotes and what stands
-/// behind a signature's "-- " is passed over. A plain value.
+/// behind a signature's "-- " or a line of underscores is passed over. A plain value.
 class MailBody {
   public:
     /// Any line of the mail's header.

@@ -52,6 +52,14 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
               "Time with the baby: Saturday 10:02, 2 photos of a baby");
     EXPECT_EQ(prompt("", {makeVisit(1, start.seconds, start.seconds, "Museum")}),
               "A visit: Museum, Saturday 10:02");
+    const auto link = makeEvent(1, start.seconds, start.seconds, KSEventProvider::foresight,
+                                KSEventCategory::linkshelf);
+    link->itemURL = "https://www.example.org/tours/?id=1";
+    EXPECT_EQ(prompt("", {link}), "Links shared with you: \"example.org/tours\", Saturday 10:02");
+    link->itemLinkTitle = "Tours";
+    link->itemDisplayName = "Anna";
+    EXPECT_EQ(prompt("", {link, hike}),
+              "A workout: \"Tours\" from Anna, Hiking, Saturday 10:02 to 12:31");
     const auto home = makeVisit(1, start.seconds, start.seconds, "Elm Street");
     home->placeUserType = 1;
     EXPECT_EQ(prompt("", {home}), "At home: Elm Street, Saturday 10:02");

@@ -44,6 +44,8 @@ media = false
 date_of_birth = 1990-05-01
 biological_sex = "other"
 addresses = ["ada@example.org", "+43 660/555"]
+[links]
+chats = ["anna@example.org", "Family"]
 [device]
 content_protection = true
 [activities]
@@ -70,6 +72,7 @@ scan = true
     EXPECT_FALSE(read->deviceData.media);
     EXPECT_EQ(read->owner.dateOfBirth, (Configuration::Day{1990, 5, 1}));
     EXPECT_EQ(read->owner.biologicalSex, 3);
+    EXPECT_THAT(read->links.chats, ElementsAre("anna@example.org", "Family"));
     EXPECT_THAT(read->owner.addresses, ElementsAre("ada@example.org", "+43 660/555"));
     EXPECT_TRUE(read->device.contentProtection);
     EXPECT_EQ(read->activities.collection, 5400);
@@ -116,6 +119,7 @@ TEST(Configuration, NamesFileLineAndKeyOfTheFirstMistake) {
         {"[owner]\ndate_of_birth = 1990-05-01T00:00:00Z\n", "2: owner.date_of_birth: must be a"},
         {"[owner]\ndate_of_birth = 1990-02-30\n", "2: "},
         {"[owner]\nbiological_sex = \"f\"\n", "2: owner.biological_sex: must be \"not set\""},
+        {"[links]\nchats = [\"a\", 1]\n", "2: links.chats: must hold strings only"},
         {"[owner]\naddresses = \"ada@x\"\n", "2: owner.addresses: must be an array of addresses"},
         {"[owner]\naddresses = [\"a@x\",\n\"Ada\"]\n",
          "3: owner.addresses: \"Ada\" is neither an address nor a telephone number"},

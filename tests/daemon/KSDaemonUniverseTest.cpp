@@ -17,15 +17,16 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
     RecordedAssertions assertions;
     const KSDaemonUniverse universe(platform.services);
     EXPECT_THAT(assertions.take(), ElementsAre());
-    EXPECT_THAT(universe.serviceNames(),
-                ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore",
-                            "EventStore", "PhotoManager", "RoutineServiceManager", "VitalsManager",
-                            "NowPlayingMediaManager", "SignificantContactManager", "TopicManager",
-                            "DefaultsManager", "EventManager", "EventBundleManager", "Server",
-                            "DaemonClientNotifier", "EventCollectionScheduler",
-                            "EventCollectionSchedulerNotifier", "EventComputeScheduler",
-                            "EventComputeSchedulerNotifier", "EventPurgeScheduler",
-                            "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
+    EXPECT_THAT(
+        universe.serviceNames(),
+        ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
+                    "PhotoManager", "RoutineServiceManager", "VitalsManager", "LinkshelfManager",
+                    "NowPlayingMediaManager", "SignificantContactManager", "TopicManager",
+                    "DefaultsManager", "EventManager", "EventBundleManager", "Server",
+                    "DaemonClientNotifier", "EventCollectionScheduler",
+                    "EventCollectionSchedulerNotifier", "EventComputeScheduler",
+                    "EventComputeSchedulerNotifier", "EventPurgeScheduler",
+                    "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;
         EXPECT_EQ(universe.getService(name), universe.getService(name));
