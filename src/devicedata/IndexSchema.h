@@ -7,7 +7,7 @@ namespace keepsakes {
 
 /// The index's schema version (`user_version`). A file of another version is not migrated: the next
 /// scan deletes it and reads the owner's files anew.
-inline constexpr int kIndexVersion = 3;
+inline constexpr int kIndexVersion = 4;
 
 /// How long either side waits for the other's lock, in milliseconds.
 inline constexpr int kIndexBusyMilliseconds = 5000;
