@@ -297,15 +297,15 @@ TEST_F(PeopleScan, ALiveDatabaseIsReadAgainWhenItsLogChanges) {
         "CREATE TABLE accounts(id, user_id, protocol);"
         "CREATE TABLE threads(id, name, account_id, type);"
         "CREATE TABLE thread_members(thread_id, user_id);"
-        "CREATE TABLE messages(uid, thread_id, sender_id, direction, time, status);"
+        "CREATE TABLE messages(uid, thread_id, sender_id, direction, time, status, body);"
         "INSERT INTO accounts VALUES(1, 1, 1);"
         "INSERT INTO threads VALUES(1, '0660111222', 1, 0);"
-        "INSERT INTO messages VALUES('a', 1, NULL, 1, 1718013600, NULL)");
+        "INSERT INTO messages VALUES('a', 1, NULL, 1, 1718013600, NULL, '')");
     EXPECT_EQ(scan().summary.totals.files, 1u);
     EXPECT_THAT(interactions(), ElementsAre("10 660111222: OWNER"));
     scan();
     EXPECT_EQ(reader_.reads, 0);
-    chatty.exec("INSERT INTO messages VALUES('b', 1, NULL, -1, 1718100000, NULL)");
+    chatty.exec("INSERT INTO messages VALUES('b', 1, NULL, -1, 1718100000, NULL, '')");
     scan();
     EXPECT_EQ(reader_.reads, 1);
     EXPECT_EQ(interactions().size(), 2u);
