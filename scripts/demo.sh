@@ -74,6 +74,7 @@ if [ "$stage" = start ]; then
         places=("$PWD/data/sample/places")
         messages=("$PWD/data/sample/messages")
         contacts=("$PWD/data/sample/contacts")
+        calendars=("$PWD/data/sample/calendars")
         export TZ=Europe/Vienna
         now=2024-06-16T20:00:00+02:00
     else
@@ -82,10 +83,11 @@ if [ "$stage" = start ]; then
         places=()
         messages=("${folders[@]}")
         contacts=("${folders[@]}")
+        calendars=("${folders[@]}")
         echo "reading ${folders[*]}"
         "$bin/keepsakes-indexer" --index "$home/look.sqlite" --tracks "${tracks[@]}" \
             --photos "${photos[@]}" --messages "${messages[@]}" \
-            --contacts "${contacts[@]}" --human
+            --contacts "${contacts[@]}" --calendars "${calendars[@]}" --human
         newest=$(newest_record "$home/look.sqlite")
         if [ -z "$newest" ]; then
             echo "There is no workout, photo occasion, visit or message in these folders, so there is" \
@@ -107,12 +109,13 @@ if [ "$stage" = start ]; then
     place_folders=$(toml_strings ${places[@]+"${places[@]}"})
     message_folders=$(toml_strings "${messages[@]}")
     contact_folders=$(toml_strings "${contacts[@]}")
+    calendar_folders=$(toml_strings "${calendars[@]}")
     mkdir -p "$XDG_CONFIG_HOME/keepsakesd"
     cat >"$XDG_CONFIG_HOME/keepsakesd/config.toml" <<EOF
 [device_data]
 tracks    = [$track_folders]
 photos    = [$photo_folders]
-calendars = []
+calendars = [$calendar_folders]
 messages  = [$message_folders]
 contacts  = [$contact_folders]
 places    = [$place_folders]

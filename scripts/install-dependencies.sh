@@ -6,7 +6,7 @@
 set -euo pipefail
 
 declare -A packages=(
-    [build]="ccache cmake g++ git libcli11-dev libexiv2-dev libexpat1-dev libfmt-dev libicu-dev libpugixml-dev
+    [build]="ccache cmake g++ git libcli11-dev libexiv2-dev libexpat1-dev libfmt-dev libical-dev libicu-dev libpugixml-dev
              libseccomp-dev libspdlog-dev libsqlite3-dev libsqlitecpp-dev libsystemd-dev
              libtomlplusplus-dev libxml2-dev nettle-dev ninja-build nlohmann-json3-dev pkg-config tzdata"
     [test]="bash-completion binutils dbus dbus-daemon dbus-user-session libglib2.0-bin libgmock-dev libgtest-dev python3

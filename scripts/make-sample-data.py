@@ -19,6 +19,8 @@ and what she listened to that week, as records of the now-playing stream (CSV);
 and, in the weeks before and during that one, text messages and calls with Anna Beispiel (an Android
 backup), mails with Jakob Muster (a Maildir), a newsletter, and an address book that knows both; a link in
 one of the messages and in one of the mails, which the owner marked;
+a calendar: two days in Vienna by train with a hotel, a film, a birthday party, and a weekly meeting
+that is no suggestion;
 and two files that cannot be read: a GPX file cut in the middle, a photo without a date.
 """
 
@@ -490,6 +492,38 @@ def make_contacts(folder):
     (folder / "freunde.vcf").write_text(CARDS.replace("\n", "\r\n"), newline="")
 
 
+# Calendar: a vdir folder, an entry a file.
+
+
+def vevent(uid, summary, start, end, *lines):
+    kind = ";VALUE=DATE" if len(start) == 8 else ";TZID=Europe/Vienna"
+    text = ["BEGIN:VCALENDAR", "VERSION:2.0", "PRODID:-//make-sample-data//EN", "BEGIN:VEVENT",
+            f"UID:{uid}", "DTSTAMP:20240601T080000Z", f"SUMMARY:{summary}",
+            f"DTSTART{kind}:{start}", f"DTEND{kind}:{end}", *lines, "END:VEVENT", "END:VCALENDAR", ""]
+    return "\r\n".join(text)
+
+
+def make_calendar(folder):
+    private = folder / "private"
+    private.mkdir(parents=True, exist_ok=True)
+    entries = {
+        "zug-hin": vevent("zug-hin", "Zug von Graz nach Wien", "20240610T082500",
+                          "20240610T110000", "DESCRIPTION:RJ 558\\, Wagen 24"),
+        "hotel": vevent("hotel", "Hotel Donau", "20240610", "20240611",
+                        "LOCATION:Uferweg 3\\, 1020 Wien\\, Oesterreich"),
+        "zug-zurueck": vevent("zug-zurueck", "Zug von Wien nach Graz", "20240611T175800",
+                              "20240611T203300", "DESCRIPTION:RJ 559"),
+        "geburtstag": vevent("geburtstag", "Geburtstagsfeier bei Anna", "20240614T193000",
+                             "20240614T233000", "LOCATION:Bei Anna"),
+        "kino": vevent("kino", "Kino: Der lange Sommer", "20240613T201500", "20240613T223000",
+                       "LOCATION:Filmzentrum\\, Graz"),
+        "besprechung": vevent("besprechung", "Teambesprechung", "20240603T090000",
+                              "20240603T100000", "RRULE:FREQ=WEEKLY;BYDAY=WE"),
+    }
+    for name, text in entries.items():
+        (private / f"{name}.ics").write_text(text, newline="")
+
+
 def main():
     beside = Path(__file__).resolve().parent.parent / "data" / "sample"
     folder = Path(sys.argv[1]) if len(sys.argv) > 1 else beside
@@ -499,6 +533,7 @@ def main():
     make_plays(folder / "media")
     make_messages(folder / "messages")
     make_contacts(folder / "contacts")
+    make_calendar(folder / "calendars")
 
 
 if __name__ == "__main__":

@@ -115,6 +115,9 @@ constexpr auto kRuleSubjects = std::to_array<Phrase>({
 /// What a cluster of nothing else but topics, or media, is called.
 constexpr std::string_view kTopicSentence = "What the day was about";
 constexpr std::string_view kMediaSentence = "Watched or listened to";
+/// What clusters of nothing else but calendar entries are called.
+constexpr std::string_view kSocialSentence = "Together";
+constexpr std::string_view kPlannedSentence = "Planned";
 
 /// What a cluster of nothing else but links is called.
 constexpr std::string_view kLinksSentence = "Links shared with you";
@@ -219,6 +222,15 @@ std::string trendText(const KSDictionary& trends) {
     return fmt::format("{}, {}", lowerCased(wording.title), wordsOf(wording, verdict));
 }
 
+bool isSocial(const KSEventPointer& event) {
+    return event->category() == KSEventCategory::socialEvent ||
+           event->suggestedEventCategory == KSSuggestedEventCategorySocial;
+}
+
+bool isSuggested(const KSEventPointer& event) {
+    return event->category() == KSEventCategory::structuredEvent || isSocial(event);
+}
+
 std::string_view headline(const KSEventBundle& bundle) {
     if (std::ranges::all_of(bundle.events, isTrend)) return kTrendSentence;
     if (const auto sentence = phraseOf(kRuleSentences, bundle.bundleType); !sentence.empty()) {
@@ -227,6 +239,8 @@ std::string_view headline(const KSEventBundle& bundle) {
     if (std::ranges::all_of(bundle.events, isMedia)) return kMediaSentence;
     if (std::ranges::all_of(bundle.events, hasTopics)) return kTopicSentence;
     if (std::ranges::all_of(bundle.events, isLink)) return kLinksSentence;
+    if (std::ranges::all_of(bundle.events, isSocial)) return kSocialSentence;
+    if (std::ranges::all_of(bundle.events, isSuggested)) return kPlannedSentence;
     const bool workout = holds(bundle, KSEventCategory::workout);
     const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
     const bool visit = holds(bundle, KSEventCategory::visit);

@@ -16,6 +16,7 @@
 #include "core/Json.h"
 #include "model/ContactSummary.h"
 #include "model/LinkSummary.h"
+#include "model/SuggestionSummary.h"
 #include "model/TopicNames.h"
 
 namespace keepsakes {
@@ -90,7 +91,10 @@ std::string detailsOf(const KSEvent& event) {
     add(event.workoutType);
     add(event.category() == KSEventCategory::visit ? visitDetails(event) : event.placeName);
     add(event.suggestedEventTitle);
+    add(std::string(suggestionWord(event.suggestedEventCategory)));
+    add(suggestionPlace(event));
     add(event.tripTitle);
+    add(tripPartsText(event));
     add(event.mediaTitle);
     add(event.mediaArtist);
     if (event.mediaSumTimePlayed) {

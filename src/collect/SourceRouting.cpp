@@ -3,11 +3,13 @@
 
 #include <utility>
 
+#include "sources/KSForesightTravelManager.h"
 #include "sources/KSLinkshelfManager.h"
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "sources/KSSignificantContactManager.h"
+#include "sources/KSSuggestedEventManager.h"
 #include "sources/KSTopicManager.h"
 #include "sources/KSVitalsManager.h"
 
@@ -28,6 +30,8 @@ EventSources::EventSources(const ServiceLookup& universe)
       photoManager_(universe.service<KSPhotoManager>("PhotoManager")),
       topicManager_(universe.service<KSTopicManager>("TopicManager")),
       linkshelfManager_(universe.service<KSLinkshelfManager>("LinkshelfManager")),
+      suggestedEventManager_(universe.service<KSSuggestedEventManager>("SuggestedEventManager")),
+      foresightTravelManager_(universe.service<KSForesightTravelManager>("ForesightTravelManager")),
       nowPlayingMediaManager_(universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")),
       significantContactManager_(
           universe.service<KSSignificantContactManager>("SignificantContactManager")) {
@@ -66,6 +70,20 @@ EventSources::EventSources(const ServiceLookup& universe)
             {"resultSharedSuccess",
              [source = linkshelfManager_](KSDate start, KSDate end, ResultHandler done) {
                  source->fetchAndSaveSharedContentBetweenStartDate(start, end, std::move(done));
+             }});
+    }
+    if (suggestedEventManager_) {
+        steps_.push_back(
+            {"resultSuggestedSuccess",
+             [source = suggestedEventManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveSuggestedEventBetweenStartDate(start, end, std::move(done));
+             }});
+    }
+    if (foresightTravelManager_) {
+        steps_.push_back(
+            {"resultTripsSuccess",
+             [source = foresightTravelManager_](KSDate start, KSDate end, ResultHandler done) {
+                 source->fetchAndSaveTripsBetweenStartDate(start, end, std::move(done));
              }});
     }
     if (nowPlayingMediaManager_) {
@@ -116,6 +134,19 @@ void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
                 return;
             }
             break;
+        case KSEventCategory::travel:
+            if (foresightTravelManager_) {
+                foresightTravelManager_->removeTripEventsDeletedAtSource(group, handler);
+                return;
+            }
+            break;
+        case KSEventCategory::structuredEvent:
+        case KSEventCategory::socialEvent:
+            if (suggestedEventManager_) {
+                suggestedEventManager_->removeSuggestedEventsDeletedAtSource(group, handler);
+                return;
+            }
+            break;
         case KSEventCategory::significantContact:
             if (significantContactManager_) {
                 significantContactManager_->removeConversationsDeletedAtSource(group, handler);
@@ -163,6 +194,19 @@ void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
         case KSEventCategory::linkshelf:
             if (linkshelfManager_) {
                 handler(linkshelfManager_->rehydratedSharedContentEvents(group), std::nullopt);
+                return;
+            }
+            break;
+        case KSEventCategory::travel:
+            if (foresightTravelManager_) {
+                handler(foresightTravelManager_->rehydratedTripEvents(group), std::nullopt);
+                return;
+            }
+            break;
+        case KSEventCategory::structuredEvent:
+        case KSEventCategory::socialEvent:
+            if (suggestedEventManager_) {
+                handler(suggestedEventManager_->rehydratedSuggestedEvents(group), std::nullopt);
                 return;
             }
             break;

@@ -12,11 +12,13 @@
 
 namespace keepsakes {
 
+class KSForesightTravelManager;
 class KSLinkshelfManager;
 class KSNowPlayingMediaManager;
 class KSPhotoManager;
 class KSRoutineServiceManager;
 class KSSignificantContactManager;
+class KSSuggestedEventManager;
 class KSTopicManager;
 class KSVitalsManager;
 
@@ -53,6 +55,8 @@ class EventSources {
     std::shared_ptr<KSPhotoManager> photoManager_;
     std::shared_ptr<KSTopicManager> topicManager_;
     std::shared_ptr<KSLinkshelfManager> linkshelfManager_;
+    std::shared_ptr<KSSuggestedEventManager> suggestedEventManager_;
+    std::shared_ptr<KSForesightTravelManager> foresightTravelManager_;
     std::shared_ptr<KSNowPlayingMediaManager> nowPlayingMediaManager_;
     std::shared_ptr<KSSignificantContactManager> significantContactManager_;
     std::vector<CollectionStep> steps_;

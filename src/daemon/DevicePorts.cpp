@@ -8,10 +8,12 @@
 #include "core/Log.h"
 #include "core/Problems.h"
 #include "daemon/MemoryRelease.h"
+#include "devicedata/IndexedCalendarService.h"
 #include "devicedata/IndexedContactStore.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedInteractionStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
+#include "devicedata/IndexedProfileEventStore.h"
 #include "devicedata/IndexedRoutineService.h"
 #include "devicedata/IndexedSearchIndex.h"
 #include "devicedata/IndexedTopicStore.h"
@@ -83,6 +85,7 @@ IndexerOptions indexerOptions(const Configuration& configuration, std::filesyste
     options.gazetteer = configuration.deviceData.gazetteer;
     options.messages = configuration.deviceData.messages;
     options.contacts = configuration.deviceData.contacts;
+    options.calendars = configuration.deviceData.calendars;
     options.ownerAddresses = configuration.owner.addresses;
     return options;
 }
@@ -130,6 +133,8 @@ struct DevicePorts::Adapters {
           interactions(folders.cache / kIndexFile),
           contacts(folders.cache / kIndexFile),
           search(folders.cache / kIndexFile, configuration.links.chats),
+          profileEvents(folders.cache / kIndexFile),
+          calendars(folders.cache / kIndexFile),
           deviceData(*clock, indexerOptions(configuration, folders.cache / kIndexFile)),
           activities(*clock, power, activityCriteria(configuration), folders.activitiesFile()),
           media(folders.cache / kMediaStreamFile, *clock, problems),
@@ -160,6 +165,8 @@ struct DevicePorts::Adapters {
     IndexedInteractionStore interactions;
     IndexedContactStore contacts;
     IndexedSearchIndex search;
+    IndexedProfileEventStore profileEvents;
+    IndexedCalendarService calendars;
     IndexerProcess deviceData;
     ActivityTimers activities;
     MediaStreamFile media;
@@ -189,6 +196,8 @@ DevicePorts::DevicePorts(const Configuration& configuration, ConfiguredPolicy::L
     services_.topicStore = &adapters_->topics;
     services_.nearbyDevices = adapters_->nearby.get();
     services_.searchIndex = &adapters_->search;
+    services_.profileEventStore = &adapters_->profileEvents;
+    services_.calendars = &adapters_->calendars;
     services_.deviceData = &adapters_->deviceData;
     services_.activities = &adapters_->activities;
     services_.problems = &adapters_->problems;

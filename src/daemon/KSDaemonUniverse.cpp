@@ -21,11 +21,13 @@
 #include "schedulers/KSEventComputeScheduler.h"
 #include "schedulers/KSEventPurgeScheduler.h"
 #include "service/KSManageServer.h"
+#include "sources/KSForesightTravelManager.h"
 #include "sources/KSLinkshelfManager.h"
 #include "sources/KSNowPlayingMediaManager.h"
 #include "sources/KSPhotoManager.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "sources/KSSignificantContactManager.h"
+#include "sources/KSSuggestedEventManager.h"
 #include "sources/KSTopicManager.h"
 #include "sources/KSVitalsManager.h"
 #include "store/KSDefaultsManager.h"
@@ -59,6 +61,8 @@ KSDaemonUniverse::KSDaemonUniverse(const PlatformServices& platform)
     add("RoutineServiceManager", KSRoutineServiceManager::initWithUniverse(*this));
     add("VitalsManager", KSVitalsManager::initWithUniverse(*this));
     add("LinkshelfManager", KSLinkshelfManager::initWithUniverse(*this));
+    add("SuggestedEventManager", KSSuggestedEventManager::initWithUniverse(*this));
+    add("ForesightTravelManager", KSForesightTravelManager::initWithUniverse(*this));
     add("NowPlayingMediaManager", KSNowPlayingMediaManager::initWithUniverse(*this));
     add("SignificantContactManager", KSSignificantContactManager::initWithUniverse(*this));
     add("TopicManager", KSTopicManager::initWithUniverse(*this));

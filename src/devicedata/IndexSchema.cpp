@@ -160,6 +160,33 @@ CREATE TABLE people(
     identifier TEXT NOT NULL UNIQUE,
     name TEXT NOT NULL,
     score REAL NOT NULL);
+CREATE TABLE calendarEvents(
+    file INTEGER NOT NULL,
+    identifier TEXT NOT NULL,
+    start REAL NOT NULL,
+    end REAL NOT NULL,
+    allDay INTEGER NOT NULL,
+    recurs INTEGER NOT NULL,
+    title TEXT NOT NULL,
+    location TEXT NOT NULL,
+    calendar TEXT NOT NULL,
+    attendees TEXT NOT NULL,
+    category INTEGER,
+    suggestion TEXT,
+    origin TEXT,
+    destination TEXT);
+CREATE INDEX calendarEventsByFile ON calendarEvents(file);
+CREATE INDEX calendarEventsByIdentifier ON calendarEvents(identifier);
+CREATE INDEX suggestionsByEnd ON calendarEvents(end) WHERE category IS NOT NULL;
+CREATE TABLE recurrenceWindows(
+    file INTEGER PRIMARY KEY, start REAL NOT NULL, end REAL NOT NULL);
+CREATE TABLE trips(
+    id INTEGER PRIMARY KEY,
+    start REAL NOT NULL,
+    end REAL NOT NULL,
+    title TEXT NOT NULL,
+    parts TEXT NOT NULL);
+CREATE INDEX tripsByEnd ON trips(end);
 )sql";
 }
 

@@ -7,7 +7,7 @@ namespace keepsakes {
 
 /// The index's schema version (`user_version`). A file of another version is not migrated: the next
 /// scan deletes it and reads the owner's files anew.
-inline constexpr int kIndexVersion = 4;
+inline constexpr int kIndexVersion = 5;
 
 /// How long either side waits for the other's lock, in milliseconds.
 inline constexpr int kIndexBusyMilliseconds = 5000;
@@ -20,6 +20,7 @@ inline constexpr std::string_view kMetaPeopleStale = "peopleStale";
 inline constexpr std::string_view kMetaPeopleRanked = "peopleRanked";  ///< Seconds since 2001.
 inline constexpr std::string_view kMetaPeopleOwner = "peopleOwner";    ///< A hash of addresses.
 inline constexpr std::string_view kMetaHandlesLoose = "handlesLoose";
+inline constexpr std::string_view kMetaTripsStale = "tripsStale";
 inline constexpr std::string_view kMetaNextFile = "nextFile";
 
 /// What a file of the index is known as (column "state").

@@ -124,6 +124,9 @@ Answer ContentReader::read(int fd, int wanted, const ReaderContext& context, Loc
     if (kind == FileKind::photo && (wanted & kWantsPhotos) != 0) {
         return readPhotoFile(fd, context);
     }
+    if (kind == FileKind::calendar && (wanted & kWantsCalendars) != 0) {
+        return readCalendarFile(fd, context);
+    }
     if (kind == FileKind::contacts && (wanted & kWantsContacts) != 0) {
         ContactPlaces both(people, places);
         return streamed(readContactFile(fd, context, both));

@@ -16,7 +16,8 @@ enum Wanted : int {
     kWantsPhotos = 2,
     kWantsPlaces = 4,
     kWantsMessages = 8,
-    kWantsContacts = 16
+    kWantsContacts = 16,
+    kWantsCalendars = 32
 };
 
 /// Turns an open file into records. It may throw, crash, hang or eat memory: the scan is made for

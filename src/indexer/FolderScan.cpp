@@ -13,6 +13,7 @@
 #include <system_error>
 
 #include "core/Log.h"
+#include "indexer/CalendarRows.h"
 #include "indexer/ContentHash.h"
 #include "indexer/FolderListing.h"
 #include "indexer/FolderWalk.h"
@@ -24,6 +25,7 @@
 #include "indexer/PeopleRows.h"
 #include "indexer/PeopleUpdate.h"
 #include "indexer/PlaceUpdate.h"
+#include "indexer/TripUpdate.h"
 #include "indexer/VisitUpdate.h"
 
 namespace keepsakes {
@@ -52,6 +54,7 @@ bool promises(std::string_view name, int wanted) {
     static constexpr std::array<std::string_view, 1> kContacts{".vcf"};
     static constexpr std::array<std::string_view, 5> kPhotos{".jpg", ".jpeg", ".png", ".heic",
                                                              ".heif"};
+    static constexpr std::array<std::string_view, 1> kCalendars{".ics"};
     const auto dot = name.rfind('.');
     if (dot == std::string_view::npos) return false;
     std::string extension(name.substr(dot));
@@ -60,7 +63,8 @@ bool promises(std::string_view name, int wanted) {
         return (wanted & kind) != 0 && std::ranges::find(extensions, extension) != extensions.end();
     };
     return promised(kWantsTracks | kWantsPlaces, kTracks) || promised(kWantsPhotos, kPhotos) ||
-           promised(kWantsMessages, kMessages) || promised(kWantsContacts, kContacts);
+           promised(kWantsMessages, kMessages) || promised(kWantsContacts, kContacts) ||
+           promised(kWantsCalendars, kCalendars);
 }
 
 struct Refusal {
@@ -89,6 +93,7 @@ class Scan {
           people_(index_) {}
 
     void run() {
+        rereadUsedUp(index_, options_.now);
         changes_ = compareFolders(index_, searchedFolders(), [this] { tell(0, 0); });
         condemnMarked();
         moveRenamed();
@@ -125,6 +130,7 @@ class Scan {
         for (const auto& path : options_.places) add(path, kWantsPlaces);
         for (const auto& path : options_.messages) add(path, kWantsMessages);
         for (const auto& path : options_.contacts) add(path, kWantsContacts);
+        for (const auto& path : options_.calendars) add(path, kWantsCalendars);
         for (auto& folder : folders) {
             folder.mayBeMissing = std::ranges::any_of(
                 options_.standardFolders,
@@ -317,12 +323,14 @@ class Scan {
     ReaderContext contextOf(const ChangedFile& file) {
         return {.now = options_.latest,
                 .path = pathOf(file),
-                .progress = [this, told = std::uint64_t{0}](std::uint64_t bytes) mutable {
-                    if (bytes < told + kBytesPerSign) return;
-                    told = bytes;
-                    mark_.goOn();
-                    tell(done_ + bytes / kBytesPerSign, total_);
-                }};
+                .progress =
+                    [this, told = std::uint64_t{0}](std::uint64_t bytes) mutable {
+                        if (bytes < told + kBytesPerSign) return;
+                        told = bytes;
+                        mark_.goOn();
+                        tell(done_ + bytes / kBytesPerSign, total_);
+                    },
+                .today = options_.now};
     }
 
     void store(const ChangedFile& file, const ReadOutcome& outcome, FileState refusedState) {
@@ -344,11 +352,21 @@ class Scan {
         }
         if (outcome.records) {
             index_.putRecords(row.id, *outcome.records);
+            putCalendar(index_, row.id, *outcome.records);
+            tellRemarks(file, outcome.records->remarks);
         } else {
             index_.removeRecords(row.id);
         }
         index_.putFile(index_.folderId(changes_.folders[file.folder]), file.name, row);
         changed();
+    }
+
+    void tellRemarks(const ChangedFile& file, const std::vector<std::string>& remarks) {
+        for (const auto& remark : remarks) {
+            const auto line = printable(fmt::format("{}: {}", pathOf(file), remark));
+            logWarning(line);
+            if (remarks_.size() < kMostProblems) remarks_.push_back(line);
+        }
     }
 
     void forget(const ChangedFile& file) {
@@ -381,6 +399,7 @@ class Scan {
             summary_.changed = true;
         }
         if (updatePlaces(index_)) summary_.changed = true;
+        if (updateTrips(index_)) summary_.changed = true;
         commit();
     }
 
@@ -392,7 +411,8 @@ class Scan {
 
     /// Steps of progress that a file counts as: one, and more for a large one that is read whole.
     static std::uint64_t signsOf(const ChangedFile& file) {
-        const bool isReadWhole = (file.wanted & (kWantsMessages | kWantsContacts)) != 0;
+        const bool isReadWhole =
+            (file.wanted & (kWantsMessages | kWantsContacts | kWantsCalendars)) != 0;
         return 1 + (isReadWhole ? static_cast<std::uint64_t>(file.stamp.size) / kBytesPerSign : 0);
     }
 
@@ -403,6 +423,7 @@ class Scan {
         for (const auto& file : refused) {
             reporter_.problem(fmt::format("passed over {}: {}", printable(file.path), file.reason));
         }
+        for (const auto& remark : remarks_) reporter_.problem(remark);
         for (const auto& problem : changes_.problems) {
             logWarning(problem);
             reporter_.problem(problem);
@@ -421,6 +442,7 @@ class Scan {
     std::uint64_t done_ = 0;
     std::uint64_t total_ = 0;
     ScanSummary summary_;
+    std::vector<std::string> remarks_;
     std::size_t uncommitted_ = 0;
     Steady::time_point committed_ = Steady::now();
     Steady::time_point formed_ = Steady::now();

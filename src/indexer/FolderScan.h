@@ -28,13 +28,14 @@ inline constexpr std::size_t kMostProblems = 50;
 
 struct ScanOptions {
     std::filesystem::path index;
-    std::vector<std::filesystem::path> tracks;      ///< Folders searched for tracks.
-    std::vector<std::filesystem::path> photos;      ///< Folders searched for photos.
-    std::vector<std::filesystem::path> places;      ///< Folders searched for named places.
-    std::filesystem::path gazetteer;                ///< A file of towns, or empty.
-    std::vector<std::filesystem::path> messages{};  ///< Folders searched for mails and messages.
-    std::vector<std::filesystem::path> contacts{};  ///< Folders searched for address books.
-    std::vector<std::string> ownerAddresses{};      ///< The owner's own, beside those found.
+    std::vector<std::filesystem::path> tracks;       ///< Folders searched for tracks.
+    std::vector<std::filesystem::path> photos;       ///< Folders searched for photos.
+    std::vector<std::filesystem::path> places;       ///< Folders searched for named places.
+    std::filesystem::path gazetteer;                 ///< A file of towns, or empty.
+    std::vector<std::filesystem::path> messages{};   ///< Folders searched for mails and messages.
+    std::vector<std::filesystem::path> calendars{};  ///< Folders searched for calendars.
+    std::vector<std::filesystem::path> contacts{};   ///< Folders searched for address books.
+    std::vector<std::string> ownerAddresses{};       ///< The owner's own, beside those found.
     /// Those of the folders that were not asked for by name: that one is missing is no problem.
     std::vector<std::filesystem::path> standardFolders{};
     KSDate now;

@@ -131,7 +131,10 @@ IndexWriter::Totals IndexWriter::totals() {
             .places = count("SELECT count(*) FROM places"),
             .interactions = count("SELECT count(*) FROM interactions"),
             .links = count("SELECT count(*) FROM links"),
-            .people = count("SELECT count(*) FROM people")};
+            .people = count("SELECT count(*) FROM people"),
+            .calendarEvents = count("SELECT count(*) FROM calendarEvents"),
+            .suggestions = count("SELECT count(*) FROM calendarEvents"
+                                 " WHERE category IS NOT NULL")};
 }
 
 std::vector<RefusedFile> IndexWriter::refusedFiles(std::size_t most) {
@@ -290,11 +293,15 @@ void IndexWriter::removeOtherRecords(std::int64_t file) {
     begin();
     for (const char* text :
          {"DELETE FROM workouts WHERE file = ?", "DELETE FROM zones WHERE file = ?",
-          "DELETE FROM photos WHERE file = ?"}) {
+          "DELETE FROM photos WHERE file = ?", "DELETE FROM calendarEvents WHERE file = ?",
+          "DELETE FROM recurrenceWindows WHERE file = ?"}) {
         auto& remove = statement(text);
         remove.bind(1, file);
         const bool removed = remove.exec() > 0;
-        if (removed && !std::string_view(text).contains("workouts")) {
+        if (removed && std::string_view(text).contains("calendarEvents")) {
+            setMeta(kMetaTripsStale, 1);
+        } else if (removed && (std::string_view(text).contains("zones") ||
+                               std::string_view(text).contains("photos"))) {
             setMeta(kMetaOccasionsStale, 1);
         }
     }

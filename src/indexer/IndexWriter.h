@@ -67,6 +67,8 @@ class IndexWriter {
         std::uint64_t interactions = 0;
         std::uint64_t links = 0;
         std::uint64_t people = 0;
+        std::uint64_t calendarEvents = 0;
+        std::uint64_t suggestions = 0;  ///< Of them.
     };
     Totals totals();
 

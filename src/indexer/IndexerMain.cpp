@@ -32,6 +32,7 @@ constexpr const char* kHelp =
     "usage: keepsakes-indexer [--config FILE] [--index FILE] [--tracks FOLDER...]\n"
     "                         [--photos FOLDER...] [--places FOLDER...] [--gazetteer FILE]\n"
     "                         [--messages FOLDER...] [--contacts FOLDER...]\n"
+    "                         [--calendars FOLDER...]\n"
     "                         [--owner ADDRESS...] [--now SECONDS] [--seconds-per-file N]\n"
     "                         [--json | --human]\n"
     "Scans the folders once and brings the index up to date.\n"
@@ -61,7 +62,8 @@ KSDate systemNow() {
 std::optional<std::string> complete(Arguments& arguments) {
     auto& scan = arguments.scan;
     const bool needsFolders = scan.tracks.empty() && scan.photos.empty() && scan.places.empty() &&
-                              scan.messages.empty() && scan.contacts.empty();
+                              scan.messages.empty() && scan.contacts.empty() &&
+                              scan.calendars.empty();
     if (!needsFolders && !scan.index.empty()) return std::nullopt;
     const auto standard = StandardFolders::find();
     if (!standard) return standard.error().description();
@@ -77,6 +79,7 @@ std::optional<std::string> complete(Arguments& arguments) {
     if (scan.gazetteer.empty()) scan.gazetteer = configuration->deviceData.gazetteer;
     scan.messages = configuration->deviceData.messages;
     scan.contacts = configuration->deviceData.contacts;
+    scan.calendars = configuration->deviceData.calendars;
     if (scan.ownerAddresses.empty()) scan.ownerAddresses = configuration->owner.addresses;
     return std::nullopt;
 }
@@ -94,6 +97,7 @@ std::vector<std::filesystem::path>* foldersOf(std::string_view option, ScanOptio
     if (option == "--places") return &scan.places;
     if (option == "--messages") return &scan.messages;
     if (option == "--contacts") return &scan.contacts;
+    if (option == "--calendars") return &scan.calendars;
     return nullptr;
 }
 
@@ -160,8 +164,8 @@ int scan(const Arguments& arguments, FileReader& reader) {
         return kBusy;
     }
     const auto standard = defaultConfiguration().deviceData;
-    for (const auto& folders :
-         {standard.tracks, standard.photos, standard.messages, standard.contacts}) {
+    for (const auto& folders : {standard.tracks, standard.photos, standard.messages,
+                                standard.contacts, standard.calendars}) {
         options.standardFolders.insert(options.standardFolders.end(), folders.begin(),
                                        folders.end());
     }
@@ -169,7 +173,7 @@ int scan(const Arguments& arguments, FileReader& reader) {
     calendar::offsetAt(options.now);
     auto readable = options.tracks;
     for (const auto& folders :
-         {options.photos, options.places, options.messages, options.contacts}) {
+         {options.photos, options.places, options.messages, options.contacts, options.calendars}) {
         readable.insert(readable.end(), folders.begin(), folders.end());
     }
     if (!options.gazetteer.empty()) {

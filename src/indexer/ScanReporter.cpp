@@ -31,6 +31,8 @@ class JsonReporter final : public ScanReporter {
                                        {"interactions", summary.totals.interactions},
                                        {"links", summary.totals.links},
                                        {"people", summary.totals.people},
+                                       {"calendarEvents", summary.totals.calendarEvents},
+                                       {"suggestions", summary.totals.suggestions},
                                        {"read", summary.read},
                                        {"renamed", summary.renamed},
                                        {"removed", summary.removed},

@@ -247,6 +247,7 @@ std::vector<std::string> IndexerProcess::arguments() const {
     if (!options_.gazetteer.empty()) add("--gazetteer", {options_.gazetteer});
     add("--messages", options_.messages);
     add("--contacts", options_.contacts);
+    add("--calendars", options_.calendars);
     if (!options_.ownerAddresses.empty()) {
         words.emplace_back("--owner");
         words.insert(words.end(), options_.ownerAddresses.begin(), options_.ownerAddresses.end());

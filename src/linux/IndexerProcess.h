@@ -24,6 +24,7 @@ struct IndexerOptions {
     std::filesystem::path gazetteer;  ///< Empty when there is none.
     std::vector<std::filesystem::path> messages;
     std::vector<std::filesystem::path> contacts;
+    std::vector<std::filesystem::path> calendars;
     std::vector<std::string> ownerAddresses;
     /// Seconds after which `refresh` returns though the scan goes on; the next one joins it.
     double replyLimit = 100;

@@ -9,6 +9,7 @@ namespace keepsakes {
 class AnalyticsService;
 class BackgroundActivities;
 class BusListener;
+class CalendarService;
 class Clock;
 class ContactStore;
 class DeviceDataIndex;
@@ -21,6 +22,7 @@ class NowPlayingStream;
 class PhotoAnalysis;
 class PowerSources;
 class Problems;
+class ProfileEventStore;
 class RoutineService;
 class SearchIndex;
 class SystemNotifications;
@@ -56,6 +58,8 @@ struct PlatformServices {
     TopicStore* topicStore = nullptr;
     NearbyDevices* nearbyDevices = nullptr;
     SearchIndex* searchIndex = nullptr;
+    ProfileEventStore* profileEventStore = nullptr;
+    CalendarService* calendars = nullptr;
     DeviceDataIndex* deviceData = nullptr;
     BackgroundActivities* activities = nullptr;
     BusListener* listener = nullptr;

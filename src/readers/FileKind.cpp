@@ -181,6 +181,7 @@ FileKind kindOfText(std::string_view text) {
     auto line = text.substr(0, end);
     if (line.ends_with('\r')) line.remove_suffix(1);
     if (lowerCased(line) == "begin:vcard") return FileKind::contacts;
+    if (lowerCased(line) == "begin:vcalendar") return FileKind::calendar;
     if (isMailHeader(text)) return FileKind::mail;
     text.remove_prefix(std::min(end + 1, text.size()));
     return isMailSeparator(line) && isMailHeader(text) ? FileKind::mailbox : FileKind::unknown;

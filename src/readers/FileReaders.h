@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <expected>
 #include <functional>
+#include <optional>
 #include <span>
 #include <string>
 
@@ -33,7 +34,8 @@ enum class FileKind {
     mailbox,
     messageBackup,
     contacts,
-    chatHistory
+    chatHistory,
+    calendar
 };
 
 /// So many bytes from the start of a file are enough for `kindOf`.
@@ -44,7 +46,7 @@ inline constexpr std::size_t kHeadSize = 4096;
 /// recordings by their first line; JSON by the names that its first elements have; a mail by the
 /// header fields that it begins with, a mailbox by the "From " line before them, a backup of
 /// messages or calls by its root element, contacts by "BEGIN:VCARD", a messenger's history by
-/// SQLite's signature.
+/// SQLite's signature, a calendar by "BEGIN:VCALENDAR".
 FileKind kindOf(std::span<const std::byte> head);
 
 struct ReaderContext {
@@ -53,10 +55,15 @@ struct ReaderContext {
     std::string path{};
     /// Told how many bytes of a large file were read, so that it is known to go on.
     std::function<void(std::uint64_t bytes)> progress{};
+    /// The day around which what recurs is followed; `now` when absent.
+    std::optional<KSDate> today{};
 };
 
 /// The one photo that a JPEG, PNG or HEIF file is, by its metadata.
 std::expected<FileRecords, std::string> readPhotoFile(int fd, const ReaderContext& context);
+
+/// The occurrences of the entries of an iCalendar file, and what the rules make of them.
+std::expected<FileRecords, std::string> readCalendarFile(int fd, const ReaderContext& context);
 
 // The following hand what the file says of places to the sink while they read. When they answer an
 // error, the sink has got a part of a file that is not to be believed.

@@ -8,6 +8,7 @@
 #include "core/KSDate.h"
 #include "platform/GeoPoint.h"
 #include "platform/HealthStore.h"
+#include "readers/CalendarRecords.h"
 
 namespace keepsakes {
 
@@ -50,6 +51,10 @@ struct FileRecords {
     std::vector<WorkoutSample> workouts;
     std::vector<PhotoRecord> photos;
     std::vector<ZoneSpan> zones;
+    std::vector<CalendarOccurrence> occurrences{};
+    /// The time for which recurring entries were followed; nothing when there are none.
+    std::optional<KSDateInterval> recurrencesOver{};
+    std::vector<std::string> remarks{};  ///< What was left out of a file that was read, and why.
 
     friend bool operator==(const FileRecords&, const FileRecords&) = default;
 };

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "readers/CalendarReader.h"
 #include "readers/ContactReader.h"
 #include "readers/MailReader.h"
 #include "readers/MessageBackupReader.h"
@@ -39,6 +40,10 @@ std::expected<void, std::string> readMessageBackupFile(int fd, const ReaderConte
 std::expected<void, std::string> readContactFile(int fd, const ReaderContext& context,
                                                  PeopleSink& sink) {
     return readContacts(readTelling(fd, context), sink);
+}
+
+std::expected<FileRecords, std::string> readCalendarFile(int fd, const ReaderContext& context) {
+    return readCalendar(readTelling(fd, context), context);
 }
 
 }  // namespace keepsakes

@@ -96,4 +96,28 @@ inline constexpr std::size_t kLongestMail = std::size_t{1024} * 1024;
 /// Bytes of a messenger's database with its log: it is copied into memory.
 inline constexpr std::uint64_t kLargestChatHistory = std::uint64_t{256} * 1024 * 1024;
 
+// Calendars.
+
+/// Entries of one file, overrides of single occurrences included.
+inline constexpr std::size_t kMostEntries = 100000;
+/// Occurrences of one entry, and steps of a rule until its window is over: a thousand years of
+/// days.
+inline constexpr std::size_t kMostOccurrences = 2000;
+inline constexpr std::size_t kMostRuleSteps = 400000;
+/// Recurring entries are followed so many seconds back from the scan (two years and more) and
+/// ahead (a year and more); the file is read again before that window is used up.
+inline constexpr double kRecurrenceBack = 800 * 86400.0;
+inline constexpr double kRecurrenceAhead = 400 * 86400.0;
+/// An entry lies at most so many seconds ahead: fifty years.
+inline constexpr double kFarthestEntry = 50 * 366 * 86400.0;
+/// A longer one holds a wrong date, in seconds: a year and a day.
+inline constexpr double kLongestEntry = 367 * 86400.0;
+/// Rules, extra dates and exceptions of one entry, attendees, and definitions of zones in a file.
+inline constexpr std::size_t kMostRules = 8;
+inline constexpr std::size_t kMostDates = 5000;
+inline constexpr std::size_t kMostAttendees = 100;
+inline constexpr std::size_t kMostZones = 200;
+/// Bytes of a description or of structured data that the rules look at.
+inline constexpr std::size_t kLongestDescription = std::size_t{16} * 1024;
+
 }  // namespace keepsakes::limits

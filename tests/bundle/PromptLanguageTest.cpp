@@ -83,6 +83,15 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
     EXPECT_EQ(prompt("", {makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
                                     KSEventCategory::topic)}),
               "A moment: Saturday 10:02 to 12:31");
+    const auto party = makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
+                                 KSEventCategory::socialEvent);
+    party->suggestedEventTitle = "Annas Geburtstag";
+    EXPECT_EQ(prompt("", {party}), "Together: Annas Geburtstag, Saturday 10:02 to 12:31");
+    const auto table = makeEvent(2, start.seconds, end.seconds, KSEventProvider::foresight,
+                                 KSEventCategory::structuredEvent);
+    table->suggestedEventTitle = "Tisch";
+    EXPECT_EQ(prompt("", {party, table}),
+              "Planned: Annas Geburtstag, Tisch, Saturday 10:02 to 12:31");
     const auto song = makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,
                                 KSEventCategory::mediaOnRepeat);
     song->mediaTitle = "Song";

@@ -21,11 +21,11 @@ TEST(KSDaemonUniverse, MakesItsServicesInTheirOrderAndFindsThemByName) {
         universe.serviceNames(),
         ElementsAre("TocsinNotifier", "PersistenceManager", "EventBundleStore", "EventStore",
                     "PhotoManager", "RoutineServiceManager", "VitalsManager", "LinkshelfManager",
-                    "NowPlayingMediaManager", "SignificantContactManager", "TopicManager",
-                    "DefaultsManager", "EventManager", "EventBundleManager", "Server",
-                    "DaemonClientNotifier", "EventCollectionScheduler",
-                    "EventCollectionSchedulerNotifier", "EventComputeScheduler",
-                    "EventComputeSchedulerNotifier", "EventPurgeScheduler",
+                    "SuggestedEventManager", "ForesightTravelManager", "NowPlayingMediaManager",
+                    "SignificantContactManager", "TopicManager", "DefaultsManager", "EventManager",
+                    "EventBundleManager", "Server", "DaemonClientNotifier",
+                    "EventCollectionScheduler", "EventCollectionSchedulerNotifier",
+                    "EventComputeScheduler", "EventComputeSchedulerNotifier", "EventPurgeScheduler",
                     "EventPurgeSchedulerNotifier", "DaemonAnalytics"));
     for (const auto& name : universe.serviceNames()) {
         EXPECT_NE(universe.getService(name), nullptr) << name;

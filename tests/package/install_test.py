@@ -46,7 +46,7 @@ BUS_CONFIGURATION = """<!DOCTYPE busconfig PUBLIC "-//freedesktop//DTD D-Bus Bus
 # What the programs may link, each with the reason why it is no way to a network.
 ALLOWED = re.compile(r"""lib(
     systemd                             # the session bus, a local socket by the unit's word
-    | sqlite3 | icui18n | icuuc | expat | xml2 | pugixml | exiv2 | tomlplusplus   # formats
+    | sqlite3 | ical | icui18n | icuuc | expat | xml2 | pugixml | exiv2 | tomlplusplus   # formats
     | fmt | spdlog | nettle | seccomp   # text, logging, hashes, confinement
     | stdc\+\+ | m | gcc_s | c          # the languages' own
     | asan | ubsan | tsan               # in builds with a sanitizer

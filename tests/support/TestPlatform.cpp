@@ -184,6 +184,53 @@ void FakeSearchIndex::start(const SearchQuery& query, const FoundItems& found,
     completion(std::nullopt);
 }
 
+template <class Item>
+OptionalError FakeProfileEventStore::tell(std::vector<Item>& items, KSDateInterval window,
+                                          const Each<Item>& each) {
+    asked.push_back(window);
+    std::ranges::stable_sort(items, {}, [](const Item& item) { return item.startDate; });
+    for (const auto& item : items) {
+        const bool overlaps = item.startDate <= window.end && item.endDate >= window.start;
+        if (overlaps && !each(item)) break;
+    }
+    return std::exchange(nextError, std::nullopt);
+}
+
+OptionalError FakeProfileEventStore::iterateScoredEvents(const TripEventQuery& query,
+                                                         const Each<Trip>& each) {
+    return tell(trips, {query.fromDate, query.toDate}, each);
+}
+
+OptionalError FakeProfileEventStore::iterateScoredEvents(const SuggestedEventQuery& query,
+                                                         const Each<SuggestedEvent>& each) {
+    return tell(suggestedEvents, {query.fromDate, query.toDate}, each);
+}
+
+namespace {
+
+class FakeCalendarStore final : public CalendarStore {
+  public:
+    explicit FakeCalendarStore(FakeCalendarService& service) : service_(service) {}
+    Event eventWithIdentifier(const std::string& identifier) override {
+        if (service_.nextError) {
+            return std::unexpected(*std::exchange(service_.nextError, std::nullopt));
+        }
+        const auto found =
+            std::ranges::find(service_.events, identifier, &CalendarEvent::eventIdentifier);
+        return found == service_.events.end() ? std::nullopt : std::optional(*found);
+    }
+
+  private:
+    FakeCalendarService& service_;
+};
+
+}  // namespace
+
+std::unique_ptr<CalendarStore> FakeCalendarService::openStore(std::uint64_t options) {
+    opened.push_back(options);
+    return std::make_unique<FakeCalendarStore>(*this);
+}
+
 void FakeAnalytics::send(std::string_view event, const KSDictionary& fields) {
     const std::lock_guard lock(mutex_);
     sent_.emplace_back(event, fields);
@@ -293,6 +340,8 @@ TestPlatform::TestPlatform() {
     services.contactStore = &contacts;
     services.topicStore = &topics;
     services.searchIndex = &search;
+    services.profileEventStore = &profile;
+    services.calendars = &calendars;
     services.deviceData = &deviceData;
     services.activities = &activities;
     services.problems = &problems;

@@ -15,6 +15,7 @@
 #include "core/WorkQueue.h"
 #include "platform/AnalyticsService.h"
 #include "platform/BackgroundActivities.h"
+#include "platform/CalendarService.h"
 #include "platform/ContactStore.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/HealthStore.h"
@@ -23,6 +24,7 @@
 #include "platform/NearbyDevices.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
+#include "platform/ProfileEventStore.h"
 #include "platform/RoutineService.h"
 #include "platform/SearchIndex.h"
 #include "platform/SystemNotifications.h"
@@ -170,6 +172,33 @@ class FakeSearchIndex final : public SearchIndex {
                const Completion& completion) override;
 };
 
+/// Trips and suggested events in memory, likewise; an error comes after the items.
+class FakeProfileEventStore final : public ProfileEventStore {
+  public:
+    std::vector<Trip> trips;
+    std::vector<SuggestedEvent> suggestedEvents;
+    std::optional<KSError> nextError;
+    std::vector<KSDateInterval> asked;
+
+    OptionalError iterateScoredEvents(const TripEventQuery& query, const Each<Trip>& each) override;
+    OptionalError iterateScoredEvents(const SuggestedEventQuery& query,
+                                      const Each<SuggestedEvent>& each) override;
+
+  private:
+    template <class Item>
+    OptionalError tell(std::vector<Item>& items, KSDateInterval window, const Each<Item>& each);
+};
+
+/// The owner's calendars in memory, likewise.
+class FakeCalendarService final : public CalendarService {
+  public:
+    std::vector<CalendarEvent> events;
+    std::optional<KSError> nextError;
+    std::vector<std::uint64_t> opened;  ///< The options of each store.
+
+    std::unique_ptr<CalendarStore> openStore(std::uint64_t options) override;
+};
+
 class FakeAnalytics final : public AnalyticsService {
   public:
     void send(std::string_view event, const KSDictionary& fields) override;
@@ -235,6 +264,8 @@ struct TestPlatform {
     FakeTopicStore topics;
     FakeNearbyDevices nearby;  ///< Not among the services until a test puts it there.
     FakeSearchIndex search;
+    FakeProfileEventStore profile;
+    FakeCalendarService calendars;
     FakeAnalytics analytics;
     FakeDefaults defaults;
     FakeLockState lock;
