@@ -177,7 +177,7 @@ CREATE TABLE calendarEvents(
     destination TEXT);
 CREATE INDEX calendarEventsByFile ON calendarEvents(file);
 CREATE INDEX calendarEventsByIdentifier ON calendarEvents(identifier);
-CREATE INDEX suggestionsByEnd ON calendarEvents(end) WHERE category IS NOT NULL;
+CREATE INDEX calendarEventsByEnd ON calendarEvents(end);
 CREATE TABLE recurrenceWindows(
     file INTEGER PRIMARY KEY, start REAL NOT NULL, end REAL NOT NULL);
 CREATE TABLE trips(

@@ -42,6 +42,8 @@ constexpr auto kIndexed = std::to_array<IndexedEvidence>({
      textOf,
      "SELECT taken, keywords FROM photos WHERE keywords IS NOT NULL AND taken BETWEEN ? AND ?"},
     {{"workout", 0.5}, activityOf, "SELECT end, type FROM workouts WHERE end BETWEEN ? AND ?"},
+    {{"calendar", 0.35}, textOf, "SELECT end, title FROM calendarEvents WHERE end BETWEEN ? AND ?"},
+    {{"link", 0.2}, textOf, "SELECT start, title FROM links WHERE start BETWEEN ? AND ?"},
 });
 constexpr EvidenceKind kPlay{"play", 0.15};
 

@@ -53,6 +53,18 @@ class Topics : public testing::Test {
         execute(fmt::format("INSERT INTO workouts VALUES({}, {}, {}, {})", ++files, end - 3600, end,
                             type));
     }
+    void calendarEntry(double end, const std::string& title) {
+        execute(fmt::format(
+            "INSERT INTO calendarEvents VALUES({}, 'id', {}, {}, 0, 0, '{}', '', '', '',"
+            " NULL, NULL, NULL, NULL)",
+            ++files, end - 3600, end, title));
+    }
+    void link(double sent, const std::string& title) {
+        execute(
+            fmt::format("INSERT INTO links VALUES({}, 1, {}, 'https://x.org', '{}', '', '', '',"
+                        " NULL, 0)",
+                        ++files, sent, title));
+    }
     void play(double start, double seconds, const std::string& title, const std::string& genre) {
         NowPlayingRecord record;
         record.title = title;
@@ -161,10 +173,18 @@ TEST_F(Topics, ClearEvidenceReachesTheThresholdAndStrayEvidenceDoesNot) {
              for (int i = 0; i < 60; ++i) play(40000 + 600 * i, 20, "Song", "Jazz");
          },
          "Music", false},
+        {"an entry of the calendar", [this] { calendarEntry(kDay, "Klavierstunde"); }, "Piano",
+         false},
+        {"and a link, in the morning",
+         [this] { link(30000, "The best piano bars"), link(40000, "A piano trio"); }, "Piano",
+         true},
         {"what is not of the day",
          [this] {
              for (int i = 1; i < 9; ++i) photo(-3600 * i, "ski"), photo(kDay + 3600 * i, "ski");
              workout(kDay + 1, 7);
+             for (int i = 1; i < 9; ++i) {
+                 calendarEntry(kDay + 3600 * i, "ski"), link(-3600 * i, "ski");
+             }
              for (int i = 1; i < 9; ++i) play(kDay + 3600 * i, 100, "ski", "");
          },
          "Skiing", false},
@@ -172,7 +192,9 @@ TEST_F(Topics, ClearEvidenceReachesTheThresholdAndStrayEvidenceDoesNot) {
     for (const auto& row : rows) {
         const std::string what = row.what;
         if (!what.starts_with("and ")) {
-            execute("DELETE FROM photos; DELETE FROM workouts");
+            execute(
+                "DELETE FROM photos; DELETE FROM workouts; DELETE FROM calendarEvents;"
+                "DELETE FROM links");
             stream.records.clear();
         }
         row.add();
