@@ -3,7 +3,6 @@
 // behind its start, changes none of them; names and handles are bounded and in their own form. The
 // first byte chooses the sizes of the blocks.
 #include <cstdint>
-#include <cstring>
 #include <string>
 
 #include "PeopleCheck.h"
@@ -38,17 +37,10 @@ std::string folded(std::string_view text) {
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
     const auto text = kSeeds[seed % std::size(kSeeds)];
-    if (size < 16 && text.size() + 1 <= most) {
-        data[0] = static_cast<std::uint8_t>(seed >> 8U);
-        std::memcpy(data + 1, text.data(), text.size());
-        return text.size() + 1;
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    return beginOrMutate(static_cast<char>(seed >> 8U) + std::string(text), data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

@@ -3,7 +3,6 @@
 // one that the index may hold. The first two bytes choose blocks and cut; the others are messages,
 // for which header and checksum are made, or with an odd first byte a whole file.
 #include <cstdint>
-#include <cstring>
 #include <string>
 
 #include "CheckedPlaces.h"
@@ -35,21 +34,14 @@ const std::string& seedMessages(bool bigEndian) {
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
     const auto& messages = seedMessages((seed & 1U) != 0);
     const bool asFile = (seed & 2U) != 0;
     const auto bytes =
         asFile ? FitWriter::fileOf(messages) + FitWriter::fileOf(messages) : messages;
-    if (size < 16 && bytes.size() + 2 <= most) {
-        data[0] = static_cast<std::uint8_t>((seed & 0xFCU) | (asFile ? 1U : 0U));
-        data[1] = static_cast<std::uint8_t>(seed >> 8U);
-        std::memcpy(data + 2, bytes.data(), bytes.size());
-        return bytes.size() + 2;
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    const unsigned choice = (seed & 0xFCU) | (asFile ? 1U : 0U);
+    return beginOrMutate(chosen(choice, seed >> 8U, bytes), data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

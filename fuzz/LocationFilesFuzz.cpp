@@ -2,7 +2,6 @@
 // Property: blocks change nothing, a cut file tells a beginning of the places, and every record is
 // one that the index may hold. The first two bytes choose the reader, the blocks and the cut.
 #include <cstdint>
-#include <cstring>
 #include <iterator>
 #include <string>
 
@@ -55,18 +54,10 @@ const Target kTargets[] = {
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
     const auto text = kTargets[seed % std::size(kTargets)].seed;
-    if (size < 16 && text.size() + 2 <= most) {
-        data[0] = static_cast<std::uint8_t>(seed);
-        data[1] = static_cast<std::uint8_t>(seed >> 8U);
-        std::memcpy(data + 2, text.data(), text.size());
-        return text.size() + 2;
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    return beginOrMutate(chosen(seed, seed >> 8U, text), data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

@@ -4,7 +4,6 @@
 // first byte chooses the reader, the second the sizes of the blocks.
 #include <algorithm>
 #include <cstdint>
-#include <cstring>
 #include <set>
 #include <string>
 #include <vector>
@@ -51,18 +50,10 @@ std::expected<void, std::string> read(int kind, const ReadBlock& bytes, PeopleSi
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
-    const auto text = kSeeds[seed % std::size(kSeeds)];
-    if (size < 16 && text.size() + 2 <= most) {
-        data[0] = static_cast<std::uint8_t>(seed % std::size(kSeeds));
-        data[1] = static_cast<std::uint8_t>(seed >> 8U);
-        std::memcpy(data + 2, text.data(), text.size());
-        return text.size() + 2;
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    const auto kind = static_cast<unsigned>(seed % std::size(kSeeds));
+    return beginOrMutate(chosen(kind, seed >> 8U, kSeeds[kind]), data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

@@ -5,7 +5,6 @@
 
 #include <cmath>
 #include <cstdint>
-#include <cstring>
 #include <string>
 #include <string_view>
 
@@ -88,17 +87,10 @@ std::expected<FileRecords, std::string> read(std::string_view bytes) {
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
     static const std::string kSeeds[] = {jpeg(), heif(), png()};
-    const auto& bytes = kSeeds[seed % std::size(kSeeds)];
-    if (size < 16 && bytes.size() <= most) {
-        std::memcpy(data, bytes.data(), bytes.size());
-        return bytes.size();
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    return beginOrMutate(kSeeds[seed % std::size(kSeeds)], data, size, most);
 }
 
 extern "C" int LLVMFuzzerInitialize(int*, char***) {

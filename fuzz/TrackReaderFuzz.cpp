@@ -2,7 +2,6 @@
 // Property: what a file tells does not depend on how the bytes come in, a part of it tells a part,
 // and all of it is such as the index may hold. The first two bytes choose the sizes of the blocks.
 #include <cstdint>
-#include <cstring>
 #include <string>
 
 #include "CheckedPlaces.h"
@@ -28,18 +27,10 @@ constexpr std::string_view kSeeds[] = {
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
     const auto text = kSeeds[seed % std::size(kSeeds)];
-    if (size < 16 && text.size() + 2 <= most) {
-        data[0] = static_cast<std::uint8_t>(seed);
-        data[1] = static_cast<std::uint8_t>(seed >> 8U);
-        std::memcpy(data + 2, text.data(), text.size());
-        return text.size() + 2;
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    return beginOrMutate(chosen(seed, seed >> 8U, text), data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
