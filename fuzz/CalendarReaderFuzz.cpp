@@ -3,7 +3,6 @@
 // folded; occurrences lie in a believed time and are of bounded length and number; a suggestion has
 // a category. The first byte chooses the sizes of the blocks.
 #include <cstdint>
-#include <cstring>
 #include <string>
 
 #include "PeopleCheck.h"
@@ -61,17 +60,10 @@ void checkRecords(const FileRecords& records) {
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned seed) {
     const auto text = kSeeds[seed % std::size(kSeeds)];
-    if (size < 16 && text.size() + 1 <= most) {
-        data[0] = static_cast<std::uint8_t>(seed >> 8U);
-        std::memcpy(data + 1, text.data(), text.size());
-        return text.size() + 1;
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    return beginOrMutate(static_cast<char>(seed >> 8U) + std::string(text), data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

@@ -2,7 +2,6 @@
 // Property: a query, nested or cut anywhere, is either refused with a reason or printed as one that
 // parses to the same clauses; whether they hold for an item is then the same, too.
 #include <cstdint>
-#include <cstring>
 #include <string>
 
 #include "Check.h"
@@ -19,15 +18,9 @@ constexpr std::string_view kSeed =
 
 }  // namespace
 
-extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
-
 extern "C" std::size_t LLVMFuzzerCustomMutator(std::uint8_t* data, std::size_t size,
                                                std::size_t most, unsigned) {
-    if (size < 4 && kSeed.size() <= most) {
-        std::memcpy(data, kSeed.data(), kSeed.size());
-        return kSeed.size();
-    }
-    return LLVMFuzzerMutate(data, size, most);
+    return beginOrMutate(kSeed, data, size, most);
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {

@@ -143,8 +143,8 @@ void KSLinkshelfManager::_fetchAutoDonatingChatWithCompletionHandler(
     completion(chats);
 }
 
-std::expected<KSLinkshelfManager::Items, KSError> KSLinkshelfManager::querySharedContent(
-    KSDate start, KSDate end) const {
+std::optional<KSLinkshelfManager::Items> KSLinkshelfManager::querySharedContent(KSDate start,
+                                                                                KSDate end) const {
     Items items;
     if (!_linkshelfEnabled()) return items;
     bool anyChatDonates = false;
@@ -161,7 +161,7 @@ std::expected<KSLinkshelfManager::Items, KSError> KSLinkshelfManager::queryShare
         [&failed](OptionalError error) { failed = std::move(error); });
     if (!failed) return items;
     logWarning(failed->description());
-    return std::unexpected(std::move(*failed));
+    return std::nullopt;
 }
 
 void KSLinkshelfManager::fetchSharedContentBetweenStartDate(KSDate start, KSDate end,
@@ -210,13 +210,10 @@ void KSLinkshelfManager::saveSharedContents(const Items& items, const ResultHand
 
 void KSLinkshelfManager::fetchAndSaveSharedContentBetweenStartDate(KSDate start, KSDate end,
                                                                    ResultHandler handler) {
-    queue_.async([this, start, end, handler = std::move(handler)] {
-        if (const auto items = querySharedContent(start, end)) {
-            saveSharedContents(*items, handler);
-        } else {
-            handler(items.error(), {});
-        }
-    });
+    fetchSharedContentBetweenStartDate(start, end,
+                                       [this, handler = std::move(handler)](const Items& items) {
+                                           saveSharedContents(items, handler);
+                                       });
 }
 
 std::optional<KSLinkshelfManager::ItemIndex> KSLinkshelfManager::itemsBetween(

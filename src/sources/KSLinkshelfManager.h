@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <expected>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -49,7 +48,7 @@ class KSLinkshelfManager final : public KSService {
     std::shared_ptr<KSEvent> createEventFromSharedContent(const SearchableItem& item) const;
     /// Stores an event for each item that is later than the newest one stored.
     void saveSharedContents(const Items& items, const ResultHandler& handler);
-    /// When the index fails, that is the handler's error.
+    /// Calls the handler on the queue, or not at all when the index fails.
     void fetchAndSaveSharedContentBetweenStartDate(KSDate start, KSDate end, ResultHandler handler);
 
     /// Copies of the events with their item's fields; events whose item is gone are left out.
@@ -67,7 +66,8 @@ class KSLinkshelfManager final : public KSService {
                        std::shared_ptr<KSEventStore> keepsakeStore);
 
     using ItemIndex = std::unordered_map<std::string, SearchableItem>;
-    std::expected<Items, KSError> querySharedContent(KSDate start, KSDate end) const;
+    /// Nothing when the index fails.
+    std::optional<Items> querySharedContent(KSDate start, KSDate end) const;
     /// By unique identifier; nothing when there are no dates or the index fails.
     std::optional<ItemIndex> itemsBetween(std::optional<KSDateInterval> dates);
     void _removeSharedContentsDeletedAtSource(const KSEventArray& events,
