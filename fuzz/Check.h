@@ -1,42 +1,22 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <algorithm>
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <random>
 #include <string>
 #include <string_view>
-
-#include "readers/FileReaders.h"
-#include "readers/ReaderLimits.h"
-#include "readers/XmlStream.h"
 
 extern "C" std::size_t LLVMFuzzerMutate(std::uint8_t* data, std::size_t size, std::size_t most);
 
 namespace keepsakes {
-
-inline const ReaderContext kFuzzNow{KSDate{745000000}};
 
 /// Ends the run, keeping the input, when a property does not hold.
 inline void check(bool holds, const char* property) {
     if (holds) return;
     std::fprintf(stderr, "property broken: %s\n", property);
     std::abort();
-}
-
-/// The bytes in blocks of random sizes below 65; as large as they can be for seed 0.
-inline ReadBlock inBlocks(std::string_view bytes, std::size_t seed) {
-    return [bytes, random = std::minstd_rand(static_cast<unsigned>(seed)),
-            seed](std::span<char> into) mutable -> std::expected<std::size_t, std::string> {
-        const auto most = seed == 0 ? into.size() : 1 + random() % 64;
-        const auto count = std::min({most, bytes.size(), into.size()});
-        std::memcpy(into.data(), bytes.data(), count);
-        bytes.remove_prefix(count);
-        return count;
-    };
 }
 
 /// For `LLVMFuzzerCustomMutator`: begins with `first`, an input of the target's own making, and has

@@ -6,7 +6,7 @@
 #include <variant>
 #include <vector>
 
-#include "Check.h"
+#include "ReaderCheck.h"
 #include "platform/ActivityCatalogue.h"
 #include "readers/LocationRecords.h"
 #include "readers/TextFolding.h"

@@ -8,8 +8,8 @@
 #include <string>
 #include <vector>
 
-#include "Check.h"
 #include "PeopleCheck.h"
+#include "ReaderCheck.h"
 #include "readers/MailReader.h"
 #include "readers/MessageBackupReader.h"
 

@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "Check.h"
+#include "ReaderCheck.h"
 #include "readers/Handles.h"
 
 namespace keepsakes {

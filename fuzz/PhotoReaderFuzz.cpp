@@ -8,7 +8,7 @@
 #include <string>
 #include <string_view>
 
-#include "Check.h"
+#include "ReaderCheck.h"
 #include "readers/PhotoWords.h"
 #include "readers/TextFolding.h"
 

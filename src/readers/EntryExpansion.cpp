@@ -152,7 +152,7 @@ void EntryExpansion::addSeries(const CalendarEntry& entry,
         }
     }
     std::ranges::stable_sort(ranged, {}, &Ranged::from);
-    const auto identifierAt = [&entry, this](const Placed& placed) {
+    const auto identifierAt = [&entry](const Placed& placed) {
         const bool isDate = entry.start->isDate;
         return fmt::format("{}/{}", entry.uid,
                            stampOf(isDate ? placed.local : placed.start, isDate));

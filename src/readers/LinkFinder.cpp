@@ -43,16 +43,19 @@ std::string plainUrl(std::string_view text) {
         text.substr(length, std::min(text.find_first_of("/?#", length), text.size()) - length);
     if (authority.empty() || authority.contains('@')) return {};
     const char first = authority.front();
-    if (!isAlphanumeric(first) && first != '[' && static_cast<unsigned char>(first) < 0x80) {
-        return {};
-    }
+    const bool isAscii = static_cast<unsigned char>(first) < 0x80;
+    if (isAscii && !isAlphanumeric(first) && first != '[' && first != '%') return {};
     std::string url;
+    std::size_t escaped = 0;  // So many digits of an escape are left, in a case of their own.
     for (std::size_t i = 0; i < text.size() && url.size() <= limits::kLongestUrl; ++i) {
         if (isForeign(text[i])) {
             url += fmt::format("%{:02X}", static_cast<unsigned char>(text[i]));
-        } else {
-            url += i < length + authority.size() ? lowered(text[i]) : text[i];
+            escaped = 0;
+            continue;
         }
+        const bool hasNoCase = i < length + authority.size() && escaped == 0;
+        url += hasNoCase ? lowered(text[i]) : text[i];
+        escaped = text[i] == '%' ? 2 : escaped - std::min<std::size_t>(escaped, 1);
     }
     return url.size() > limits::kLongestUrl ? std::string() : url;
 }
