@@ -79,7 +79,7 @@ void EntryBuilder::line(const CardLine& line) {
     } else if (name == "ATTENDEE") {
         attendee(line);
     } else if (name == "ORGANIZER" || name == "URL") {
-        text_.origin += " " + boundedText(line.text);
+        text_.origin.append(" ").append(boundedText(line.text));
     } else if (name.starts_with("X-")) {
         extension(line);
     }
