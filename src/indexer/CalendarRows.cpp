@@ -35,15 +35,15 @@ void putCalendar(IndexWriter& index, std::int64_t file, const FileRecords& recor
                           " destination) VALUES(?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?, ?)");
     for (const auto& occurrence : records.occurrences) {
         const auto& recognition = occurrence.recognition;
-        const auto span = recognition && recognition->span
-                              ? *recognition->span
-                              : KSDateInterval{occurrence.start, occurrence.end};
+        const bool hasHours = recognition && recognition->span;
+        const auto span =
+            hasHours ? *recognition->span : KSDateInterval{occurrence.start, occurrence.end};
         put.clearBindings();
         put.bind(1, file);
         put.bind(2, occurrence.identifier);
         put.bind(3, span.start.seconds);
         put.bind(4, span.end.seconds);
-        put.bind(5, occurrence.isAllDay ? 1 : 0);
+        put.bind(5, occurrence.isAllDay && !hasHours ? 1 : 0);
         put.bind(6, occurrence.recurs ? 1 : 0);
         put.bind(7, occurrence.title);
         put.bind(8, occurrence.location);

@@ -38,7 +38,9 @@ std::string_view suggestionWord(std::uint64_t suggestedEventCategory) {
 std::string suggestionPlace(const KSEvent& event) {
     if (!event.suggestedEvent) return {};
     const auto* place = valueForKey(*event.suggestedEvent, "location").asString();
-    return place ? *place : std::string();
+    // Coordinates tell a person nothing.
+    const bool isPlace = place && place->find_first_not_of("0123456789.,;+- ") != std::string::npos;
+    return isPlace ? *place : std::string();
 }
 
 std::string tripPartsText(const KSEvent& event) {

@@ -217,6 +217,16 @@ TEST_F(CalendarScan, PutsTripsTogetherOverFiles) {
     EXPECT_EQ(found[0].title, "Lisbon, 3 to 7 May");
     EXPECT_EQ(found[0].tripParts.size(), 3u);
     EXPECT_EQ(found[0].tripParts.back().eventIdentifiers, std::vector<std::string>{"back"});
+    fs::remove(folder_ / "a/out.ics");
+    write("b/stay.ics",
+          entry("stay", "Hotel Tejo",
+                "DTSTART;VALUE=DATE:20240503\r\nDTEND;VALUE=DATE:20240507\r\n"
+                "X-R:[{\"@context\":\"http://schema.org\"\\,\"@type\":\"LodgingReservation\"\\,"
+                "\"checkinTime\":\"2024-05-03T17:00:00Z\"\\,"
+                "\"checkoutTime\":\"2024-05-07T09:00:00Z\"}]\r\n"));
+    scan();
+    ASSERT_EQ(allTrips().size(), 1u);
+    EXPECT_EQ(allTrips()[0].startDate, at("2024-05-03T17:00:00Z")) << "when the owner checks in";
     fs::remove(folder_ / "b/stay.ics");
     fs::remove(folder_ / "a/back.ics");
     scan();
