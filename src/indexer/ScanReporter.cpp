@@ -66,9 +66,11 @@ class HumanReporter final : public ScanReporter {
         const auto& totals = summary.totals;
         fmt::print(
             "{} files known: {} workouts; {} visits to {} places; {} photos in {} occasions; {} "
-            "messages and calls with {} links; {} people; {} files refused.\n",
+            "messages and calls with {} links; {} people; {} calendar entries, {} of them "
+            "suggestions; {} files refused.\n",
             totals.files, totals.workouts, totals.visits, totals.places, totals.photos,
-            totals.occasions, totals.interactions, totals.links, totals.people, totals.refused);
+            totals.occasions, totals.interactions, totals.links, totals.people,
+            totals.calendarEvents, totals.suggestions, totals.refused);
         fmt::print("This scan read {} new or changed files, found {} moved and {} gone.\n",
                    summary.read, summary.renamed, summary.removed);
     }
