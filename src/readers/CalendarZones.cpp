@@ -87,7 +87,7 @@ ZonePointer definedZone(const std::string& text) {
     if (observances == 0) return nullptr;
     ZonePointer zone(icaltimezone_new());
     if (!zone || icaltimezone_set_component(zone.get(), component.get()) == 0) return nullptr;
-    (void)component.release();  // the zone's now
+    component.release();  // NOLINT(bugprone-unused-return-value): the zone's now
     return zone;
 }
 

@@ -55,7 +55,7 @@ void MailBody::Header::line(std::string_view line) {
     const auto colon = line.find(':');
     // All three begin so; most fields of a mail do not.
     if (!line.starts_with('C') && !line.starts_with('c')) return;
-    if (colon == std::string_view::npos || colon > limits::kLongestValue) return;
+    if (colon > limits::kLongestValue) return;  // or there is none
     const auto name = lowerCased(trimmed(line.substr(0, colon)));
     auto* const field = name == "content-type"                ? &type_
                         : name == "content-transfer-encoding" ? &encoding_
