@@ -93,7 +93,7 @@ void LocationWriter::place(NamedPlace place) {
         return;
     }
     if (place.use == PlaceUse::unknown && place.origin == NamedPlace::Origin::owner) {
-        place.use = useOfName(place.name);
+        place.use = useOfPlaceName(place.name);
     }
     guarded([this, &place] { index_.putNamedPlace(file_, place); });
 }

@@ -183,9 +183,10 @@ class GeoJson final : public JsonPlaces<Place> {
         } else if (!feature_.hasTime && !feature_.name.empty()) {
             times_.addPlace();
             const auto stated = useOfLabel(feature_.use);
-            places_.place({.position = position,
-                           .name = feature_.name,
-                           .use = stated == PlaceUse::unknown ? useOfName(feature_.name) : stated});
+            places_.place(
+                {.position = position,
+                 .name = feature_.name,
+                 .use = stated == PlaceUse::unknown ? useOfPlaceName(feature_.name) : stated});
         }
     }
 

@@ -119,7 +119,7 @@ class Recording {
             times_.addPlace();
             places_.place({.position = *position,
                            .name = message.description,
-                           .use = useOfName(message.description)});
+                           .use = useOfPlaceName(message.description)});
         }
     }
 

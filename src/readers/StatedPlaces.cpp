@@ -99,7 +99,7 @@ PlaceUse useOfLabel(std::string_view label) {
     return PlaceUse::unknown;
 }
 
-PlaceUse useOfName(std::string_view name) {
+PlaceUse useOfPlaceName(std::string_view name) {
     const auto word = inferenceOfKeyword(name);
     if (word == "home") return PlaceUse::home;
     return word == "work" ? PlaceUse::work : PlaceUse::unknown;

@@ -53,7 +53,7 @@ std::string nameOf(const JsonScalar& value);
 PlaceUse useOfLabel(std::string_view label);
 
 /// What the owner's own name for a place says of its use: "Home", "Zuhause", "Office" as a whole.
-PlaceUse useOfName(std::string_view name);
+PlaceUse useOfPlaceName(std::string_view name);
 
 /// Adds the span of a known offset; a span that follows the last within a day, with the same
 /// offset, prolongs it.

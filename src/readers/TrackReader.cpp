@@ -140,7 +140,7 @@ bool isNumberedByDevice(std::string_view name) {
 class TrackFile final : public XmlHandler {
   public:
     TrackFile(const ReaderContext& context, LocationSink& places)
-        : now_(context.now), places_(places) {}
+        : now_(context.now), places_(places), times_(context.now) {}
 
     void startElement(std::string_view name, XmlAttributes attributes) override {
         const auto parent = path_.empty() ? Place::document : path_.back();
@@ -173,12 +173,7 @@ class TrackFile final : public XmlHandler {
         if (tooMany_) {
             return std::unexpected(fmt::format("more than {} workouts", limits::kMostWorkouts));
         }
-        if (takenTimes_ == 0 && insaneTimes_ > 0) {
-            return std::unexpected("no timestamp lies between 1990-01-01 and a day from now");
-        }
-        if (takenTimes_ == 0 && unreadableTimes_ > 0) {
-            return std::unexpected("no timestamp can be read");
-        }
+        if (auto complaint = times_.complaint()) return std::unexpected(std::move(*complaint));
         return std::move(records_);
     }
 
@@ -254,7 +249,7 @@ class TrackFile final : public XmlHandler {
                 // How receivers call the symbol of a house.
                 if (value() == "Residence") waypoint_.use = PlaceUse::home;
                 if (waypoint_.use == PlaceUse::unknown) {
-                    waypoint_.use = useOfName(value().value_or(""));
+                    waypoint_.use = useOfPlaceName(value().value_or(""));
                 }
                 break;
             case Place::waypoint:
@@ -314,17 +309,7 @@ class TrackFile final : public XmlHandler {
 
     /// A timestamp without a zone is UTC, as both schemas ask.
     std::optional<ParsedDate> time(std::string_view text) {
-        const auto parsed = parseISO8601(trimmed(text));
-        if (!parsed) {
-            ++unreadableTimes_;
-            return std::nullopt;
-        }
-        if (!limits::isSane(parsed->date, now_)) {
-            ++insaneTimes_;
-            return std::nullopt;
-        }
-        ++takenTimes_;
-        return parsed;
+        return times_.take(parseISO8601(trimmed(text)));
     }
 
     std::optional<std::string_view> value() const {
@@ -339,9 +324,7 @@ class TrackFile final : public XmlHandler {
     std::string otherRoot_;
     std::string value_;
     bool tooMany_ = false;
-    std::uint64_t takenTimes_ = 0;
-    std::uint64_t insaneTimes_ = 0;
-    std::uint64_t unreadableTimes_ = 0;
+    TimeTally times_;
 
     std::optional<TrackSummary> track_;
     TrackSample point_;
