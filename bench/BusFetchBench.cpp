@@ -12,8 +12,8 @@
 #include <thread>
 #include <vector>
 
+#include "bus/BusHandles.h"
 #include "client/ConduitClient.h"
-#include "wire/BusHandles.h"
 #include "wire/BusListener.h"
 #include "wire/MessageEncoder.h"
 

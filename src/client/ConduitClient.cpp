@@ -8,7 +8,7 @@
 #include <charconv>
 #include <system_error>
 
-#include "wire/BusHandles.h"
+#include "bus/BusHandles.h"
 #include "wire/BusNames.h"
 #include "wire/MessageDecoder.h"
 #include "wire/MessageEncoder.h"

@@ -11,8 +11,8 @@
 #include <system_error>
 #include <utility>
 
+#include "bus/BusHandles.h"
 #include "core/Clock.h"
-#include "linux/BusHandles.h"
 #include "linux/BusProperties.h"
 
 namespace keepsakes {
@@ -104,12 +104,12 @@ bool readObjects(sd_bus_message* message, Objects& objects) {
     return entered == 0;
 }
 
-std::expected<bus::OwnedMessage, KSError> call(sd_bus* connection, const char* path,
-                                               const char* interface, const char* member) {
+std::expected<bus::Message, KSError> call(sd_bus* connection, const char* path,
+                                          const char* interface, const char* member) {
     sd_bus_message* made = nullptr;
     int result =
         sd_bus_message_new_method_call(connection, &made, kService, path, interface, member);
-    const bus::OwnedMessage request(made);
+    const bus::Message request(made);
     if (result >= 0) result = sd_bus_message_set_auto_start(request.get(), 0);
     if (result < 0) return failure(member, result);
     sd_bus_message* answer = nullptr;
@@ -118,7 +118,7 @@ std::expected<bus::OwnedMessage, KSError> call(sd_bus* connection, const char* p
                     static_cast<std::uint64_t>(BluezDevices::kCallLimitSeconds * kMicroseconds),
                     nullptr, &answer);
     if (result < 0) return failure(member, result);
-    return bus::OwnedMessage(answer);
+    return bus::Message(answer);
 }
 
 std::expected<Objects, KSError> readObjects(sd_bus* connection) {
@@ -134,7 +134,7 @@ std::expected<Objects, KSError> readObjects(sd_bus* connection) {
 NearbyDevices::Devices BluezDevices::devicesNear() {
     sd_bus* opened = nullptr;
     const int result = sd_bus_open_system(&opened);
-    const bus::OwnedConnection connection(opened);
+    const bus::Connection connection(opened);
     if (result < 0) return failure("the system bus", result);
     auto objects = readObjects(connection.get());
     if (scan_ && objects && !isStopped_) {

@@ -21,8 +21,8 @@
 #include <system_error>
 #include <thread>
 
+#include "bus/BusHandles.h"
 #include "core/Log.h"
-#include "linux/BusHandles.h"
 #include "linux/FileWatch.h"
 
 namespace keepsakes {
@@ -114,13 +114,13 @@ class BusThread::Loop {
     struct Following {
         explicit Following(BusFollower* toTell) : follower(toTell) {}
         BusFollower* const follower;
-        bus::OwnedSlot owner;
-        bus::OwnedSlot signals;
+        bus::Slot owner;
+        bus::Slot signals;
     };
     struct PendingCall {
         Loop* loop = nullptr;
         Handler handler;
-        bus::OwnedSlot slot;
+        bus::Slot slot;
         std::list<PendingCall>::iterator self;
     };
 
@@ -146,7 +146,7 @@ class BusThread::Loop {
     std::atomic<bool> mayConnect_ = true;
 
     // Only on the thread, once it runs.
-    bus::OwnedConnection connection_;
+    bus::Connection connection_;
     std::list<Following> followings_;
     std::list<PendingCall> pending_;
     double retrySeconds_ = kFirstRetrySeconds;
@@ -205,7 +205,7 @@ int BusThread::Loop::open() {
 
 int BusThread::Loop::subscribe(Following& following) {
     const std::string service = following.follower->service();
-    const auto match = [this, &following](bus::OwnedSlot& slot, const std::string& rule,
+    const auto match = [this, &following](bus::Slot& slot, const std::string& rule,
                                           sd_bus_message_handler_t handler) {
         sd_bus_slot* made = nullptr;
         const int result = sd_bus_add_match_async(connection_.get(), &made, rule.c_str(), handler,
@@ -307,7 +307,7 @@ void BusThread::Loop::call(const char* service, const char* path, const char* in
     sd_bus_message* made = nullptr;
     int result =
         sd_bus_message_new_method_call(connection_.get(), &made, service, path, interface, member);
-    const bus::OwnedMessage message(made);
+    const bus::Message message(made);
     if (result >= 0 && build) result = build(made);
     sd_bus_slot* slot = nullptr;
     if (result >= 0) {

@@ -19,16 +19,13 @@
 #include <thread>
 #include <utility>
 
+#include "bus/BusHandles.h"
 #include "core/Log.h"
-#include "linux/BusHandles.h"
 #include "linux/PlayerProperties.h"
 
 namespace keepsakes {
 
 namespace {
-
-using bus::OwnedConnection;
-using bus::OwnedSlot;
 
 struct EndEvents {
     void operator()(sd_event* event) const { sd_event_unref(event); }
@@ -67,7 +64,7 @@ double awakeSeconds() {
 /// The watcher's thread: everything here but `start` and `stop` happens on it.
 class MediaWatcher::Loop {
   public:
-    Loop(OwnedConnection connection, PlayTracker::Sink sink, Now now)
+    Loop(bus::Connection connection, PlayTracker::Sink sink, Now now)
         : connection_(std::move(connection)), now_(std::move(now)), tracker_(std::move(sink)) {}
 
     OptionalError start();
@@ -84,7 +81,7 @@ class MediaWatcher::Loop {
         bool asking = false;  ///< Its state is being asked for.
         int signals = 0;      ///< Since `countedFrom`, on the awake clock.
         double countedFrom = 0;
-        OwnedSlot properties, seeks, call;
+        bus::Slot properties, seeks, call;
         OwnedEventSource deaf;
     };
 
@@ -120,13 +117,13 @@ class MediaWatcher::Loop {
     std::thread thread_;
 
     // Only on the thread:
-    OwnedConnection connection_;
+    bus::Connection connection_;
     const Now now_;
     PlayTracker tracker_;
     OwnedEvent event_;
-    OwnedSlot ownerChanges_, names_;
+    bus::Slot ownerChanges_, names_;
     std::map<std::string, std::unique_ptr<Player>, std::less<>> players_;  ///< By connection.
-    std::map<std::string, OwnedSlot> ownerCalls_;                          ///< By name.
+    std::map<std::string, bus::Slot> ownerCalls_;                          ///< By name.
     bool full_ = false;  ///< There are players that are not listened to.
 };
 
@@ -428,7 +425,7 @@ std::expected<std::unique_ptr<MediaWatcher>, KSError> MediaWatcher::start(PlayTr
     if (const int result = sd_bus_open_user(&opened); result < 0) {
         return std::unexpected(busError("cannot connect to the session bus", result));
     }
-    auto loop = std::make_unique<Loop>(OwnedConnection(opened), std::move(sink), std::move(now));
+    auto loop = std::make_unique<Loop>(bus::Connection(opened), std::move(sink), std::move(now));
     std::unique_ptr<MediaWatcher> watcher(new MediaWatcher(std::move(loop)));
     if (auto error = watcher->loop_->start()) return std::unexpected(std::move(*error));
     return watcher;

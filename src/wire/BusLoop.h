@@ -9,8 +9,8 @@
 #include <thread>
 #include <unordered_map>
 
+#include "bus/BusHandles.h"
 #include "wire/Answer.h"
-#include "wire/BusHandles.h"
 #include "wire/KSKeepsakesConduitProtocol.h"
 #include "wire/Mailbox.h"
 #include "wire/MessageEncoder.h"

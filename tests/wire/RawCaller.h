@@ -5,7 +5,7 @@
 #include <stdexcept>
 #include <string>
 
-#include "wire/BusHandles.h"
+#include "bus/BusHandles.h"
 #include "wire/BusNames.h"
 
 namespace keepsakes {

@@ -8,8 +8,8 @@
 namespace keepsakes::bus {
 
 /// Owners of the bus library's objects. Private to sources: it pulls in the library's header.
-/// The library counts references without locks, so a connection and all its messages belong to
-/// one thread.
+/// The library counts references without locks, so a connection and all that came of it, messages
+/// and slots, belong to one thread.
 struct Unref {
     void operator()(sd_bus* bus) const { sd_bus_close_unref(bus); }
     void operator()(sd_bus_message* message) const { sd_bus_message_unref(message); }
