@@ -8,12 +8,9 @@
 #include <fstream>
 #include <functional>
 #include <string>
-#include <vector>
 
 #include "Bench.h"
 #include "readers/FileReaders.h"
-#include "readers/ReaderLimits.h"
-#include "readers/XmlStream.h"
 #include "support/FitWriter.h"
 #include "support/TemporaryFolder.h"
 
@@ -72,14 +69,7 @@ using Reader = std::expected<FileRecords, std::string> (*)(int, const ReaderCont
 
 bool measure(const std::string& what, const std::filesystem::path& path, Reader reader) {
     const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    const auto readBytes = [fd] {
-        auto read = readDescriptor(fd);
-        std::vector<char> block(limits::kBlockSize);
-        while (read(block).value_or(0) > 0) {
-        }
-    };
-    readBytes();  // The file is then cached for both.
-    const double bytesOnly = bench::bestMilliseconds(1, readBytes);
+    const double bytesOnly = bench::readingMilliseconds(1, fd);
     const long before = bench::peakKiB();
     Counter counter;
     std::string error;
@@ -87,16 +77,13 @@ bool measure(const std::string& what, const std::filesystem::path& path, Reader 
         const auto records = reader(fd, {parseISO8601("2024-06-16")->date}, counter);
         error = records ? "" : records.error();
     });
-    const long growth = bench::peakKiB() - before;
     ::close(fd);
 
     const auto megabytes = static_cast<double>(std::filesystem::file_size(path)) / 1e6;
     const auto title = fmt::format("read 1,000,000 points of {} ({:.0f} MB)", what, megabytes);
     bench::report(title + " / allowed", taken, kAllowedMilliseconds, 1);
-    fmt::print("{} / reading only its bytes|{:.1f} ms|{:.1f} ms|{:.1f}|-\n", title, taken,
-               bytesOnly, taken / bytesOnly);
-    fmt::print("memory of reading it|{} KiB|{} KiB|{:.2f}|1\n", growth, kMostGrowthKiB,
-               static_cast<double>(growth) / static_cast<double>(kMostGrowthKiB));
+    bench::note(title + " / reading only its bytes", taken, bytesOnly);
+    bench::reportGrowth("memory of reading it", before, kMostGrowthKiB);
     if (!error.empty()) fmt::print(stderr, "{}: {}\n", what, error);
     if (counter.points != kPoints) fmt::print(stderr, "{}: {} points\n", what, counter.points);
     return error.empty() && counter.points == kPoints;

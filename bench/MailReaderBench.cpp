@@ -2,19 +2,15 @@
 // Reads an mbox file of 100,000 mails beside reading only its bytes, and scans it into an index:
 // mails per second, and how the peak of resident memory grows with five times as many.
 #include <fcntl.h>
-#include <fmt/format.h>
-#include <sys/resource.h>
 #include <unistd.h>
 
 #include <filesystem>
 #include <fstream>
-#include <vector>
 
 #include "Bench.h"
+#include "ScanBench.h"
 #include "indexer/ContentReader.h"
-#include "indexer/FolderScan.h"
-#include "readers/ReaderLimits.h"
-#include "readers/XmlStream.h"
+#include "support/TemporaryFolder.h"
 
 using namespace keepsakes;
 namespace fs = std::filesystem;
@@ -34,14 +30,6 @@ class CountingSink final : public PeopleSink {
     void card(const ContactCard&) override {}
     void ownerHandle(const std::string&) override {}
     int count = 0;
-};
-
-class SilentReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { fmt::print(stderr, "problem: {}\n", line); }
-    void report(const ScanSummary& done) override { interactions = done.totals.interactions; }
-    std::uint64_t interactions = 0;
 };
 
 /// Mails as they come: a dozen lines of what servers add, three kilobytes of text.
@@ -67,58 +55,42 @@ void makeMailbox(const fs::path& path, int mails) {
     }
 }
 
-long peakKiB() {
-    rusage usage{};
-    ::getrusage(RUSAGE_SELF, &usage);
-    return usage.ru_maxrss;
-}
-
 double scanMilliseconds(const fs::path& root, const char* index, std::uint64_t& found) {
-    const auto mark = ReadMark::take(root / "mark");
     ContentReader reader;
-    SilentReporter reporter;
+    bench::Scan scan(root);
     const double took = bench::bestMilliseconds(1, [&] {
-        const auto error = scanFolders({.index = root / index,
-                                        .tracks = {},
-                                        .photos = {},
-                                        .messages = {root / "Mail"},
-                                        .contacts = {},
-                                        .ownerAddresses = {},
-                                        .now = kNow},
-                                       reader, **mark, reporter);
-        if (error) fmt::print(stderr, "scan: {}\n", error->description());
+        scan.run({.index = root / index,
+                  .tracks = {},
+                  .photos = {},
+                  .messages = {root / "Mail"},
+                  .contacts = {},
+                  .ownerAddresses = {},
+                  .now = kNow},
+                 reader);
     });
-    found = reporter.interactions;
+    found = scan.summary().totals.interactions;
     return took;
 }
 
 }  // namespace
 
 int main() {
-    auto name = (fs::temp_directory_path() / "mailbench.XXXXXX").string();
-    if (!::mkdtemp(name.data())) return 1;
-    const fs::path root(name);
+    const TemporaryFolder folder;
+    const auto& root = folder.path();
     const auto path = root / "Mail" / "Inbox";
     fs::create_directories(path.parent_path());
     makeMailbox(path, kMails);
     const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    const auto readBytes = [fd] {
-        auto read = readDescriptor(fd);
-        std::vector<char> block(limits::kBlockSize);
-        while (read(block).value_or(0) > 0) {
-        }
-    };
-    readBytes();  // The file is then cached for both.
-    const double bytesOnly = bench::bestMilliseconds(3, readBytes);
+    const double bytesOnly = bench::readingMilliseconds(3, fd);
     CountingSink sink;
     const double parsed = bench::bestMilliseconds(3, [&] {
         sink.count = 0;
         (void)!readMailboxFile(fd, {.now = kNow}, sink).has_value();
     });
     ::close(fd);
-    fmt::print("read {} mails ({:.0f} MB) / reading only the bytes|{:.0f} ms|{:.0f} ms|{:.1f}|10\n",
-               sink.count, static_cast<double>(fs::file_size(path)) / 1e6, parsed, bytesOnly,
-               parsed / bytesOnly);
+    bench::report(fmt::format("read {} mails ({:.0f} MB) / reading only the bytes", sink.count,
+                              static_cast<double>(fs::file_size(path)) / 1e6),
+                  parsed, bytesOnly, 10);
 
     std::uint64_t found = 0;
     const double indexed = scanMilliseconds(root, "small.sqlite", found);
@@ -126,13 +98,11 @@ int main() {
                               static_cast<double>(found) / indexed * 1000),
                   indexed, kMails * kMillisecondsPerMail, 1);
     const double unchanged = scanMilliseconds(root, "small.sqlite", found);
-    fmt::print("scan them again, unchanged|{:.1f} ms|-|-|-\n", unchanged);
-    const long before = peakKiB();
+    bench::note("scan them again, unchanged", unchanged);
+    const long before = bench::peakKiB();
     makeMailbox(path, 5 * kMails);
     scanMilliseconds(root, "large.sqlite", found);
-    const long growth = peakKiB() - before;
-    fmt::print("memory of indexing {} mails more|{} KiB|{} KiB|{:.2f}|1\n", found - kMails, growth,
-               kMostGrowthKiB, static_cast<double>(growth) / kMostGrowthKiB);
-    fs::remove_all(root);
+    bench::reportGrowth(fmt::format("memory of indexing {} mails more", found - kMails), before,
+                        kMostGrowthKiB);
     return found == 5U * kMails ? 0 : 1;
 }

@@ -49,7 +49,6 @@ int main() {
     if (heard != payload.size() * 2 * kRuns * kListeners * kNotifications) return 1;
     const double limit = kNotifications * kLimitMilliseconds;
     bench::report("10,000 notifications to five listeners in a row, 20 µs each", inARow, limit, 1);
-    fmt::print("the same one by one|{:.1f} ms|{:.1f} ms|{:.2f}|-\n", oneByOne, limit,
-               oneByOne / limit);
+    bench::note("the same one by one", oneByOne, limit);
     for (const auto& dispatcher : dispatchers) dispatcher->invalidate();
 }

@@ -1,19 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 // Rescan of 10,000 unchanged files beside a stat of each (limit: 3 times as long), the occasions of
 // 100,000 photos (limit: a second), and the memory of a scan for each file.
-#include <fmt/format.h>
-#include <sys/resource.h>
 #include <sys/stat.h>
 
-#include <algorithm>
-#include <chrono>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 
 #include "Bench.h"
-#include "indexer/FolderScan.h"
+#include "ScanBench.h"
 #include "indexer/OccasionUpdate.h"
+#include "support/TemporaryFolder.h"
 
 using namespace keepsakes;
 namespace fs = std::filesystem;
@@ -43,38 +39,11 @@ class TinyReader final : public FileReader {
     double count_ = 0;
 };
 
-class SilentReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { fmt::print("problem: {}\n", line); }
-    void report(const ScanSummary& done) override { summary = done; }
-    ScanSummary summary;
-};
-
-double milliseconds(const std::function<void()>& work) {
-    const auto start = std::chrono::steady_clock::now();
-    work();
-    return std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start)
-        .count();
-}
-
-double best(int rounds, const std::function<void()>& work) {
-    double least = 1e300;
-    for (int i = 0; i < rounds; ++i) least = std::min(least, milliseconds(work));
-    return least;
-}
-
-long peakKilobytes() {
-    rusage usage{};
-    ::getrusage(RUSAGE_SELF, &usage);
-    return usage.ru_maxrss;
-}
-
 }  // namespace
 
 int main() {
-    std::string name = (fs::temp_directory_path() / "keepsakes-bench-XXXXXX").string();
-    const fs::path root = ::mkdtemp(name.data());
+    const TemporaryFolder temporary;
+    const auto& root = temporary.path();
     constexpr int kFiles = 10000;
     std::vector<std::string> paths;
     for (int i = 0; i < kFiles; ++i) {
@@ -84,22 +53,19 @@ int main() {
         std::ofstream(paths.back()) << i;
     }
     const auto index = root / "index.sqlite";
-    const auto mark = ReadMark::take(root / "mark");
     TinyReader reader;
-    SilentReporter reporter;
-    const auto scan = [&] {
-        const auto error =
-            scanFolders({.index = index, .tracks = {}, .photos = {root / "Pictures"}, .now = {0}},
-                        reader, **mark, reporter);
-        if (error) fmt::print("scan: {}\n", error->description());
+    bench::Scan scan(root);
+    const auto scanAll = [&] {
+        scan.run({.index = index, .tracks = {}, .photos = {root / "Pictures"}, .now = {0}}, reader);
     };
-    const long before = peakKilobytes();
-    const double first = milliseconds(scan);
-    fmt::print("first scan of {} tiny files, {} bytes of memory a file|{:.0f} ms|-|-|-\n",
-               reporter.summary.read, (peakKilobytes() - before) * 1024 / kFiles, first);
-    const double rescan = best(15, scan);
+    const long before = bench::peakKiB();
+    const double first = bench::bestMilliseconds(1, scanAll);
+    bench::note(fmt::format("first scan of {} tiny files, {} bytes of memory a file",
+                            scan.summary().read, (bench::peakKiB() - before) * 1024 / kFiles),
+                first);
+    const double rescan = bench::bestMilliseconds(15, scanAll);
     struct stat info {};
-    const double stats = best(15, [&] {
+    const double stats = bench::bestMilliseconds(15, [&] {
         for (const auto& path : paths) (void)!::stat(path.c_str(), &info);
     });
     bench::report("rescan 10,000 unchanged files / stat of the same", rescan, stats, 3);
@@ -124,8 +90,7 @@ int main() {
         writer.commit({0});
     };
     constexpr double kMostMilliseconds = 1000;
-    fmt::print("occasions of 100,000 photos, the first time|{:.0f} ms|-|-|-\n",
-               milliseconds(update));
-    bench::report("occasions of 100,000 photos, again", best(3, update), kMostMilliseconds, 1);
-    fs::remove_all(root);
+    bench::note("occasions of 100,000 photos, the first time", bench::bestMilliseconds(1, update));
+    bench::report("occasions of 100,000 photos, again", bench::bestMilliseconds(3, update),
+                  kMostMilliseconds, 1);
 }

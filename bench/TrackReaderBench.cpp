@@ -5,18 +5,13 @@
 #include <fmt/core.h>
 #include <unistd.h>
 
-#include <chrono>
-#include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <string>
-#include <vector>
 
 #include "Bench.h"
 #include "readers/FileReaders.h"
-#include "readers/ReaderLimits.h"
-#include "readers/XmlStream.h"
+#include "support/TemporaryFolder.h"
 
 namespace {
 
@@ -60,52 +55,33 @@ class NoPlaces final : public LocationSink {
     void place(NamedPlace) override {}
 };
 
-double seconds(const auto& work) {
-    const auto start = std::chrono::steady_clock::now();
-    work();
-    return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-}
-
 }  // namespace
 
 int main() {
-    auto folder = (std::filesystem::temp_directory_path() / "trackbench.XXXXXX").string();
-    if (!::mkdtemp(folder.data())) return 1;
-    const auto path = std::filesystem::path(folder) / "large.gpx";
+    const TemporaryFolder folder;
+    const auto path = folder / "large.gpx";
     makeFile(path);
     const auto megabytes = static_cast<double>(std::filesystem::file_size(path)) / kMegabyte;
     const int fd = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
-
-    const auto readBytes = [fd] {
-        auto read = readDescriptor(fd);
-        std::vector<char> block(limits::kBlockSize);
-        while (read(block).value_or(0) > 0) {
-        }
-    };
-    readBytes();  // The file is then cached for both.
-    const double bytesOnly = seconds(readBytes);
+    const double bytesOnly = bench::readingMilliseconds(1, fd);
     const long before = bench::peakKiB();
     std::size_t workouts = 0;
     std::string error;
     NoPlaces places;
-    const double parsed = seconds([fd, &workouts, &error, &places] {
+    const double parsed = bench::bestMilliseconds(1, [fd, &workouts, &error, &places] {
         const auto records = readTrackFile(fd, {parseISO8601("2024-06-16")->date}, places);
         workouts = records ? records->workouts.size() : 0;
         error = records ? "" : records.error();
     });
     ::close(fd);
-    std::filesystem::remove_all(folder);
 
     if (!error.empty()) fmt::print(stderr, "{}\n", error);
-    const double limit = megabytes / kLeastPace;
-    fmt::print(
-        "read {0:.0f} MB of GPX ({1:.0f} MB/s) / {2:.0f} MB/s|{3:.2f} s|{4:.2f} s|{5:.2f}|1\n",
-        megabytes, megabytes / parsed, kLeastPace, parsed, limit, parsed / limit);
-    fmt::print("read {:.0f} MB of GPX / reading only its bytes|{:.2f} s|{:.3f} s|{:.1f}|-\n",
-               megabytes, parsed, bytesOnly, parsed / bytesOnly);
+    const auto title = fmt::format("read {:.0f} MB of GPX", megabytes);
+    bench::report(
+        fmt::format("{} ({:.0f} MB/s) / {:.0f} MB/s", title, megabytes / parsed * 1000, kLeastPace),
+        parsed, megabytes / kLeastPace * 1000, 1);
+    bench::note(title + " / reading only its bytes", parsed, bytesOnly);
     constexpr long kMostGrowthKiB = 16 * 1024;
-    const long growth = bench::peakKiB() - before;
-    fmt::print("memory of reading it|{} KiB|{} KiB|{:.2f}|1\n", growth, kMostGrowthKiB,
-               static_cast<double>(growth) / kMostGrowthKiB);
+    bench::reportGrowth("memory of reading it", before, kMostGrowthKiB);
     return error.empty() && workouts > 0 ? 0 : 1;
 }

@@ -2,7 +2,6 @@
 // Indexes a year of a phone's log, a million points of GPX, and prints the time beside ten seconds
 // and beside that of only reading the bytes; then has the visits of its last month rehydrated.
 #include <fcntl.h>
-#include <sys/resource.h>
 #include <unistd.h>
 
 #include <cmath>
@@ -11,16 +10,15 @@
 #include <numbers>
 
 #include "Bench.h"
+#include "ScanBench.h"
 #include "core/Log.h"
 #include "devicedata/IndexedRoutineService.h"
 #include "indexer/ContentReader.h"
-#include "indexer/FolderScan.h"
 #include "notify/KSTocsinNotifier.h"
-#include "readers/ReaderLimits.h"
-#include "readers/XmlStream.h"
 #include "sources/KSRoutineServiceManager.h"
 #include "store/KSEventStore.h"
 #include "store/KSPersistenceManager.h"
+#include "support/TemporaryFolder.h"
 #include "support/TestEvents.h"
 #include "support/TestPlatform.h"
 
@@ -66,59 +64,33 @@ void writeLog(const fs::path& path) {
     file << "</trkseg></trk></gpx>\n";
 }
 
-class Counts final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { fmt::print(stderr, "problem: {}\n", line); }
-    void report(const ScanSummary& summary) override { totals = summary.totals; }
-    IndexWriter::Totals totals;
-};
-
-long peakKiB() {
-    rusage usage{};
-    ::getrusage(RUSAGE_SELF, &usage);
-    return usage.ru_maxrss;
-}
-
 void indexLog(const fs::path& root, const fs::path& index) {
     const auto log = root / "Tracks" / "log.gpx";
     fs::create_directories(log.parent_path());
     writeLog(log);
     const int fd = ::open(log.c_str(), O_RDONLY | O_CLOEXEC);
-    const double bytesOnly = bench::bestMilliseconds(3, [fd] {
-        auto read = readDescriptor(fd);
-        std::vector<char> block(limits::kBlockSize);
-        while (read(block).value_or(0) > 0) {
-        }
-    });
+    const double bytesOnly = bench::readingMilliseconds(3, fd);
     ::close(fd);
-    const auto mark = ReadMark::take(root / "mark");
-    Counts counts;
-    const long before = peakKiB();
+    bench::Scan scan(root);
+    const long before = bench::peakKiB();
     const double took = bench::bestMilliseconds(2, [&] {
         IndexWriter::remove(index);
         ContentReader reader;
-        const auto error = scanFolders({.index = index,
-                                        .tracks = {root / "Tracks"},
-                                        .photos = {},
-                                        .places = {},
-                                        .gazetteer = {},
-                                        .now = kEnd},
-                                       reader, **mark, counts);
-        if (error) fmt::print(stderr, "{}\n", error->description());
+        scan.run({.index = index,
+                  .tracks = {root / "Tracks"},
+                  .photos = {},
+                  .places = {},
+                  .gazetteer = {},
+                  .now = kEnd},
+                 reader);
     });
     constexpr double kMostMilliseconds = 10000;
     bench::report("index 1,000,000 points of GPX / 10 s", took, kMostMilliseconds, 1);
-    fmt::print(
-        "index 1,000,000 points of GPX / reading only its bytes|{:.0f} ms|{:.1f} ms|{:.0f}"
-        "|-\n",
-        took, bytesOnly, took / bytesOnly);
+    bench::note("index 1,000,000 points of GPX / reading only its bytes", took, bytesOnly);
     fmt::print("visits found in them; bytes of the index for each point|{}|{:.1f}|-|-\n",
-               counts.totals.visits, static_cast<double>(fs::file_size(index)) / kPoints);
+               scan.summary().totals.visits, static_cast<double>(fs::file_size(index)) / kPoints);
     constexpr long kMostGrowthKiB = 32 * 1024;
-    const long growth = peakKiB() - before;
-    fmt::print("memory of indexing them|{} KiB|{} KiB|{:.2f}|1\n", growth, kMostGrowthKiB,
-               static_cast<double>(growth) / kMostGrowthKiB);
+    bench::reportGrowth("memory of indexing them", before, kMostGrowthKiB);
 }
 
 /// The events of the visits that overlap the window.
@@ -164,10 +136,8 @@ void rehydrate(const fs::path& index) {
 
 int main() {
     setLogLevel(LogLevel::off);
-    std::string name = (fs::temp_directory_path() / "keepsakes-bench-XXXXXX").string();
-    const fs::path root = ::mkdtemp(name.data());
-    const auto index = root / "index.sqlite";
-    indexLog(root, index);
+    const TemporaryFolder folder;
+    const auto index = folder / "index.sqlite";
+    indexLog(folder.path(), index);
     rehydrate(index);
-    fs::remove_all(root);
 }
