@@ -8,10 +8,33 @@
 
 namespace keepsakes {
 
+void Hold::close() {
+    const std::lock_guard lock(mutex_);
+    if (!gate_) gate_.emplace();
+}
+
+void Hold::open() {
+    const std::lock_guard lock(mutex_);
+    if (gate_) gate_->signal();
+    gate_.reset();
+}
+
+void Hold::pass() {
+    std::optional<Semaphore> gate;
+    {
+        const std::lock_guard lock(mutex_);
+        gate = gate_;
+    }
+    if (!gate) return;
+    gate->wait();
+    gate->signal();  // for whoever waits behind
+}
+
 void FakeHealthStore::queryWorkouts(KSDateInterval window, std::function<void(Workouts)> handler) {
     queue_.async([this, window, handler = std::move(handler)] {
         asked.push_back(window);
         if (silent) return;
+        hold.pass();
         if (nextError) {
             handler(std::unexpected(*std::exchange(nextError, std::nullopt)));
             return;
@@ -85,6 +108,7 @@ void FakeRoutineService::fetchStoredVisits(const VisitFetchOptions& options,
                                            std::function<void(Visits)> handler) {
     queue_.async([this, options, handler = std::move(handler)] {
         asked.push_back(options.interval);
+        hold.pass();
         if (visitsError) {
             handler(std::unexpected(*visitsError));
             return;
@@ -116,6 +140,7 @@ void FakeRoutineService::fetchRoutineModeFromLocation(GeoPoint, std::function<vo
 void FakeNowPlayingStream::read(KSDate start, const EachRecord& each,
                                 const std::function<void(OptionalError)>& completion) {
     asked.push_back(start);
+    hold.pass();
     if (nextError) {
         completion(std::exchange(nextError, std::nullopt));
         return;
@@ -129,6 +154,7 @@ void FakeNowPlayingStream::read(KSDate start, const EachRecord& each,
 InteractionStore::Interactions FakeInteractionStore::queryInteractions(
     const InteractionQuery& query) {
     asked.push_back(query);
+    hold.pass();
     if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
     std::vector<Interaction> found;
     std::ranges::copy_if(interactions, std::back_inserter(found), [&query](const auto& one) {
@@ -143,6 +169,7 @@ InteractionStore::Interactions FakeInteractionStore::queryInteractions(
 
 ContactStore::Contacts FakeContactStore::rankedContacts(
     std::span<const std::string> personIdentifiers) {
+    hold.pass();
     if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
     std::vector<RankedContact> found;
     std::ranges::copy_if(contacts, std::back_inserter(found), [&](const auto& contact) {
@@ -167,6 +194,7 @@ NearbyDevices::Devices FakeNearbyDevices::devicesNear() {
 TopicStore::Scores FakeTopicStore::scoresForTopicMapping(std::string_view mapping,
                                                          const TopicQuery& query) {
     asked.emplace_back(mapping, query);
+    hold.pass();
     if (nextError) return std::unexpected(*std::exchange(nextError, std::nullopt));
     return scores;
 }
@@ -174,6 +202,7 @@ TopicStore::Scores FakeTopicStore::scoresForTopicMapping(std::string_view mappin
 void FakeSearchIndex::start(const SearchQuery& query, const FoundItems& found,
                             const Completion& completion) {
     asked.push_back(query);
+    hold.pass();
     const bool isOfChats = query.queryString.starts_with(searchkey::kIsChatAutoDonating);
     if (nextError && !isOfChats) {
         completion(std::exchange(nextError, std::nullopt));
@@ -188,6 +217,7 @@ template <class Item>
 OptionalError FakeProfileEventStore::tell(std::vector<Item>& items, KSDateInterval window,
                                           const Each<Item>& each) {
     asked.push_back(window);
+    hold.pass();
     std::ranges::stable_sort(items, {}, [](const Item& item) { return item.startDate; });
     for (const auto& item : items) {
         const bool overlaps = item.startDate <= window.end && item.endDate >= window.start;

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "core/Problems.h"
+#include "core/Semaphore.h"
 #include "core/ServiceLookup.h"
 #include "core/WorkQueue.h"
 #include "platform/AnalyticsService.h"
@@ -36,6 +37,20 @@
 
 namespace keepsakes {
 
+/// Where a fake that was asked stays until the test lets it answer. Open before the fake's asker is
+/// destroyed.
+class Hold {
+  public:
+    void close();
+    void open();
+    /// Returns at once while it is open.
+    void pass();
+
+  private:
+    std::mutex mutex_;
+    std::optional<Semaphore> gate_;
+};
+
 /// A health store in memory: holds workouts, fails or stays silent when told to, tells what it was
 /// asked.
 class FakeHealthStore final : public HealthStore {
@@ -45,6 +60,7 @@ class FakeHealthStore final : public HealthStore {
     std::optional<int> sex;
     std::optional<KSError> nextError;
     bool silent = false;
+    Hold hold;
     std::vector<KSDateInterval> asked;
 
     void queryWorkouts(KSDateInterval window, std::function<void(Workouts)> handler) override;
@@ -90,6 +106,7 @@ class FakeRoutineService final : public RoutineService {
     std::optional<KSError> visitsError;
     std::optional<KSError> locationsError;
     std::optional<KSError> modeError;
+    Hold hold;
     std::vector<KSDateInterval> asked;           ///< For visits.
     std::vector<KSDateInterval> askedLocations;  ///< For locations of interest.
 
@@ -109,6 +126,7 @@ class FakeNowPlayingStream final : public NowPlayingStream {
   public:
     std::vector<NowPlayingRecord> records;
     std::optional<KSError> nextError;
+    Hold hold;
     std::vector<KSDate> asked;
 
     void read(KSDate start, const EachRecord& each,
@@ -121,6 +139,7 @@ class FakeInteractionStore final : public InteractionStore {
   public:
     std::vector<Interaction> interactions;
     std::optional<KSError> nextError;
+    Hold hold;
     std::vector<InteractionQuery> asked;
 
     Interactions queryInteractions(const InteractionQuery& query) override;
@@ -131,6 +150,7 @@ class FakeContactStore final : public ContactStore {
   public:
     std::vector<RankedContact> contacts;
     std::optional<KSError> nextError;
+    Hold hold;
 
     std::vector<RelatedPerson> related;
 
@@ -154,6 +174,7 @@ class FakeTopicStore final : public TopicStore {
   public:
     std::map<std::string, double> scores;
     std::optional<KSError> nextError;
+    Hold hold;
     std::vector<std::pair<std::string, TopicQuery>> asked;
 
     Scores scoresForTopicMapping(std::string_view mapping, const TopicQuery& query) override;
@@ -166,6 +187,7 @@ class FakeSearchIndex final : public SearchIndex {
     std::vector<SearchableItem> items;
     std::vector<SearchableItem> donatingChats;
     std::optional<KSError> nextError;
+    Hold hold;
     std::vector<SearchQuery> asked;
 
     void start(const SearchQuery& query, const FoundItems& found,
@@ -178,6 +200,7 @@ class FakeProfileEventStore final : public ProfileEventStore {
     std::vector<Trip> trips;
     std::vector<SuggestedEvent> suggestedEvents;
     std::optional<KSError> nextError;
+    Hold hold;
     std::vector<KSDateInterval> asked;
 
     OptionalError iterateScoredEvents(const TripEventQuery& query, const Each<Trip>& each) override;
