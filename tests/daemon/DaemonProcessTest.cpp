@@ -47,12 +47,19 @@ class DaemonProcess : public testing::Test {
         folder.write("config/keepsakesd/config.toml", "[device_data]\n" + deviceData);
     }
 
-    /// Waits until the log says so.
-    void waitForLog(const std::string& text) const {
-        while (log().find(text) == std::string::npos) {
-            ASSERT_EQ(waitpid(running, nullptr, WNOHANG), 0) << log();
+    /// Waits until it holds; a daemon that ends meanwhile is a failure.
+    template <class Condition>
+    void waitUntil(const Condition& holds) const {
+        while (!holds()) {
+            siginfo_t ended{};
+            waitid(P_PID, static_cast<id_t>(running), &ended, WEXITED | WNOHANG | WNOWAIT);
+            ASSERT_EQ(ended.si_pid, 0) << log();
             std::this_thread::yield();
         }
+    }
+
+    void waitForLog(const std::string& text) const {
+        waitUntil([this, &text] { return log().find(text) != std::string::npos; });
     }
 
     /// Starts a daemon whose log goes to a file; does not wait for it.
@@ -71,10 +78,7 @@ class DaemonProcess : public testing::Test {
     void startAndConnect() {
         running = start();
         client = ConduitClient::connect().value();
-        while (!client->status()) {
-            ASSERT_EQ(waitpid(running, nullptr, WNOHANG), 0) << log();
-            std::this_thread::yield();
-        }
+        waitUntil([this] { return client->status().has_value(); });
     }
 
     int end(int signal) {
@@ -207,7 +211,10 @@ TEST_F(DaemonProcess, SigtermDuringACollectionEndsInOrder) {
         static_cast<void>(other->collectEvents());
     });
     // The first sign of the collection is its date on disk.
-    while (client->status().value().lastCollection == 0) std::this_thread::yield();
+    waitUntil([this] {
+        const auto status = client->status();
+        return status && status->lastCollection != 0;
+    });
     EXPECT_EQ(end(SIGTERM), 0) << log();
     caller.join();
     EXPECT_EQ(integrity(), "ok");
@@ -241,7 +248,10 @@ TEST_F(DaemonProcess, StartsLockedAndOpensTheDatabaseWithTheUnlock) {
     logind.addSession("c1", true, true);
     EXPECT_FALSE(client->status()->databaseAvailable);
     logind.setLocked("c1", false);
-    while (!client->status()->databaseAvailable) std::this_thread::yield();
+    waitUntil([this] {
+        const auto status = client->status();
+        return status && status->databaseAvailable;
+    });
     EXPECT_EQ(end(SIGTERM), 0) << log();
 }
 
