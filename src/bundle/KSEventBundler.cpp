@@ -69,7 +69,6 @@ std::vector<KSGraph::Edge> edgesBetween(const std::vector<Span>& spans) {
 }
 
 void logClusters(const KSEventBundler::Clusters& clusters) {
-    if (!logsDebug()) return;
     for (const auto& [label, events] : clusters) {
         for (const auto& event : events) {
             logDebug(fmt::format("cluster {}: {}", label, event->description()));
@@ -135,7 +134,11 @@ KSEventBundler::Clusters KSEventBundler::calculateEventBundlesFromEvents(
     for (std::size_t index = 0; index < events.size(); ++index) {
         clusters[membership[index]].push_back(events[index]);
     }
-    logClusters(clusters);
+    if (logsDebug()) {
+        logDebug(fmt::format("{} events between {} and {} are {} clusters", events.size(),
+                             formatISO8601(startDate_), formatISO8601(endDate_), clusters.size()));
+        logClusters(clusters);
+    }
     return clusters;
 }
 
