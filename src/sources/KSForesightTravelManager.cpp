@@ -7,17 +7,17 @@
 #include <algorithm>
 #include <iterator>
 #include <optional>
-#include <unordered_set>
 #include <utility>
 
 #include "core/Clock.h"
 #include "core/KSAssertion.h"
-#include "core/Log.h"
 #include "core/MurmurHash3.h"
 #include "model/KSExtensions.h"
 #include "platform/PlatformServices.h"
 #include "sources/AlmanacCoding.h"
+#include "sources/IdentifiedEvents.h"
 #include "sources/Lifetimes.h"
+#include "sources/ProfileItems.h"
 #include "store/KSEventStore.h"
 
 namespace keepsakes {
@@ -54,17 +54,8 @@ std::shared_ptr<KSForesightTravelManager> KSForesightTravelManager::initWithProf
 void KSForesightTravelManager::fetchTripsBetweenStartDate(KSDate start, KSDate end,
                                                           TripsHandler handler) {
     queue_.async([this, start, end, handler = std::move(handler)] {
-        Trips trips;
-        const auto error = profileStore_.iterateScoredEvents(TripEventQuery{start, end},
-                                                             [&trips](const auto& trip) {
-                                                                 trips.push_back(trip);
-                                                                 return true;
-                                                             });
-        if (error) {
-            logWarning(error->description());
-            return;
-        }
-        handler(trips);
+        const auto trips = profileItems<Trip>(profileStore_, TripEventQuery{start, end});
+        if (trips) handler(*trips);
     });
 }
 
@@ -89,23 +80,14 @@ std::string KSForesightTravelManager::_providerIdOfTrip(const Trip& trip) {
 void KSForesightTravelManager::saveTrips(const Trips& trips, const ResultHandler& handler) {
     KSDate earliest = KSDate::distantFuture();
     for (const auto& trip : trips) earliest = std::min(earliest, trip.startDate);
-    std::unordered_set<std::string> stored;
-    OptionalError failed;
-    keepsakeStore_->fetchEventsWithStartDateAfter(
-        earliest, KSEventCategory::travel,
-        [&stored, &failed](const KSEventArray& events, const OptionalError& error) {
-            failed = error;
-            for (const auto& event : events) {
-                if (event->identifierFromProvider) stored.insert(*event->identifierFromProvider);
-            }
-        });
-    if (failed) {
-        handler(failed, {});
+    const auto stored = storedIdentifiers(*keepsakeStore_, earliest, KSEventCategory::travel);
+    if (!stored) {
+        handler(stored.error(), {});
         return;
     }
     KSEventArray fresh;
     for (const auto& trip : trips) {
-        if (!stored.contains(_providerIdOfTrip(trip))) fresh.push_back(createEventFromTrip(trip));
+        if (!stored->contains(_providerIdOfTrip(trip))) fresh.push_back(createEventFromTrip(trip));
     }
     keepsakeStore_->storeEvents(fresh, handler);
 }
@@ -134,21 +116,17 @@ KSEventArray KSForesightTravelManager::rehydratedTripEvents(const KSEventArray& 
     KSEventArray refreshed;
     const auto trips = tripsOfEvents(events);
     if (!trips) return refreshed;
-    for (const auto& event : events) {
-        if (!event->identifierFromProvider) continue;
-        const auto found = trips->find(*event->identifierFromProvider);
-        if (found == trips->end()) continue;
-        auto filled = event->copy();
+    forEachFoundIn(*trips, events, [&refreshed](const KSEvent& event, const Trip& trip) {
+        auto filled = event.copy();
         // The narrow copy drops it, and a client that stores back what it fetched must not lose it.
-        filled->identifierFromProvider = event->identifierFromProvider;
-        filled->tripTitle = found->second.title;
-        if (!found->second.tripParts.empty()) {
+        filled->identifierFromProvider = event.identifierFromProvider;
+        filled->tripTitle = trip.title;
+        if (!trip.tripParts.empty()) {
             auto& parts = filled->tripParts.emplace();
-            std::ranges::transform(found->second.tripParts, std::back_inserter(parts),
-                                   encodeTripPart);
+            std::ranges::transform(trip.tripParts, std::back_inserter(parts), encodeTripPart);
         }
         refreshed.push_back(std::move(filled));
-    }
+    });
     return refreshed;
 }
 
@@ -164,12 +142,7 @@ void KSForesightTravelManager::_removeTripEventsDeletedAtSource(const KSEventArr
         handler(std::nullopt, {});
         return;
     }
-    KSEventArray gone;
-    std::ranges::copy_if(events, std::back_inserter(gone), [&trips](const auto& event) {
-        const auto& identifier = event->identifierFromProvider;
-        return !identifier || !trips->contains(*identifier);
-    });
-    keepsakeStore_->removeEvents(gone, handler);
+    keepsakeStore_->removeEvents(eventsMissingIn(*trips, events), handler);
 }
 
 void KSForesightTravelManager::waitForQueueEmpty() {

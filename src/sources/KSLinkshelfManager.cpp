@@ -5,7 +5,6 @@
 #include <fmt/ranges.h>
 
 #include <algorithm>
-#include <iterator>
 #include <utility>
 
 #include "core/Clock.h"
@@ -14,6 +13,7 @@
 #include "model/KSExtensions.h"
 #include "platform/PlatformServices.h"
 #include "platform/UserDefaults.h"
+#include "sources/IdentifiedEvents.h"
 #include "sources/Lifetimes.h"
 #include "store/KSEventStore.h"
 
@@ -238,11 +238,9 @@ KSEventArray KSLinkshelfManager::rehydratedSharedContentEvents(const KSEventArra
     if (dates) *dates = {dates->start - kMarginSeconds, dates->end + kMarginSeconds};
     const auto items = itemsBetween(dates);
     if (!items) return filled;
-    for (const auto& event : events) {
-        if (!event->identifierFromProvider) continue;
-        const auto item = items->find(*event->identifierFromProvider);
-        if (item != items->end()) filled.push_back(rehydratedEvent(*event, item->second));
-    }
+    forEachFoundIn(*items, events, [&filled](const KSEvent& event, const SearchableItem& item) {
+        filled.push_back(rehydratedEvent(event, item));
+    });
     return filled;
 }
 
@@ -260,12 +258,7 @@ void KSLinkshelfManager::_removeSharedContentsDeletedAtSource(const KSEventArray
                 {});
         return;
     }
-    KSEventArray gone;
-    std::ranges::copy_if(events, std::back_inserter(gone), [&items](const auto& event) {
-        const auto& identifier = event->identifierFromProvider;
-        return !identifier || !items->contains(*identifier);
-    });
-    keepsakeStore_->removeEvents(gone, handler);
+    keepsakeStore_->removeEvents(eventsMissingIn(*items, events), handler);
 }
 
 void KSLinkshelfManager::waitForQueueEmpty() {

@@ -15,6 +15,7 @@
 #include "model/KSExtensions.h"
 #include "platform/PhotoAnalysis.h"
 #include "platform/PlatformServices.h"
+#include "sources/IdentifiedEvents.h"
 #include "sources/Lifetimes.h"
 #include "store/KSEventStore.h"
 
@@ -188,12 +189,7 @@ void KSPhotoManager::_removePhotoEventsDeletedAtSource(const KSEventArray& event
             }
         }
     }
-    KSEventArray gone;
-    std::ranges::copy_if(events, std::back_inserter(gone), [&existing](const auto& event) {
-        const auto& identifier = event->identifierFromProvider;
-        return !identifier || !existing.contains(*identifier);
-    });
-    eventStore_->removeEvents(gone, handler);
+    eventStore_->removeEvents(eventsMissingIn(existing, events), handler);
 }
 
 }  // namespace keepsakes

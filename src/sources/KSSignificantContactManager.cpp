@@ -7,7 +7,6 @@
 #include <algorithm>
 #include <optional>
 #include <set>
-#include <unordered_set>
 #include <utility>
 
 #include "core/Calendar.h"
@@ -18,6 +17,7 @@
 #include "model/KSExtensions.h"
 #include "platform/PlatformServices.h"
 #include "sources/ContactCoding.h"
+#include "sources/IdentifiedEvents.h"
 #include "sources/Lifetimes.h"
 #include "store/KSEventStore.h"
 
@@ -207,23 +207,15 @@ void KSSignificantContactManager::saveConversations(const Conversations& convers
     for (const auto& conversation : conversations) {
         earliest = std::min(earliest, conversation->interactions().front().startDate);
     }
-    std::unordered_set<std::string> stored;
-    OptionalError failed;
-    keepsakeStore_->fetchEventsWithStartDateAfter(
-        earliest, KSEventCategory::significantContact,
-        [&stored, &failed](const KSEventArray& events, const OptionalError& error) {
-            failed = error;
-            for (const auto& event : events) {
-                if (event->identifierFromProvider) stored.insert(*event->identifierFromProvider);
-            }
-        });
-    if (failed) {
-        handler(failed, {});
+    const auto stored =
+        storedIdentifiers(*keepsakeStore_, earliest, KSEventCategory::significantContact);
+    if (!stored) {
+        handler(stored.error(), {});
         return;
     }
     KSEventArray fresh;
     for (const auto& conversation : conversations) {
-        if (stored.contains(_providerIdOfConversation(*conversation))) continue;
+        if (stored->contains(_providerIdOfConversation(*conversation))) continue;
         fresh.push_back(createEventFromConversation(*conversation));
     }
     keepsakeStore_->storeEvents(fresh, handler);
@@ -259,22 +251,18 @@ KSEventArray KSSignificantContactManager::rehydrateConversations(const KSEventAr
     KSEventArray refreshed;
     const auto conversations = conversationsOfEvents(events);
     if (!conversations) return refreshed;
-    for (const auto& event : events) {
-        if (!event->identifierFromProvider) continue;
-        const auto found = conversations->find(*event->identifierFromProvider);
-        if (found == conversations->end()) continue;
-        const auto& conversation = *found->second;
-        auto filled = event->copy();
+    forEachFoundIn(*conversations, events, [&refreshed](const KSEvent& event, const auto& found) {
+        auto filled = event.copy();
         // The narrow copy drops it, and a client that stores back what it fetched must not lose it.
-        filled->identifierFromProvider = event->identifierFromProvider;
-        filled->interactionContactScore = conversation.scoredContact()->score;
-        filled->interactionScoredContact = encodeContact(*conversation.scoredContact());
+        filled->identifierFromProvider = event.identifierFromProvider;
+        filled->interactionContactScore = found->scoredContact()->score;
+        filled->interactionScoredContact = encodeContact(*found->scoredContact());
         auto& interactions = filled->interactions.emplace();
-        for (const auto& interaction : conversation.interactions()) {
+        for (const auto& interaction : found->interactions()) {
             interactions.push_back(encodeInteraction(interaction));
         }
         refreshed.push_back(std::move(filled));
-    }
+    });
     return refreshed;
 }
 
@@ -285,12 +273,7 @@ void KSSignificantContactManager::removeConversationsDeletedAtSource(const KSEve
         handler(std::nullopt, {});
         return;
     }
-    KSEventArray gone;
-    std::ranges::copy_if(events, std::back_inserter(gone), [&conversations](const auto& event) {
-        const auto& identifier = event->identifierFromProvider;
-        return !identifier || !conversations->contains(*identifier);
-    });
-    keepsakeStore_->removeEvents(gone, handler);
+    keepsakeStore_->removeEvents(eventsMissingIn(*conversations, events), handler);
 }
 
 void KSSignificantContactManager::waitForQueueEmpty() {

@@ -13,7 +13,9 @@
 #include "platform/CalendarService.h"
 #include "platform/PlatformServices.h"
 #include "sources/AlmanacCoding.h"
+#include "sources/IdentifiedEvents.h"
 #include "sources/Lifetimes.h"
+#include "sources/ProfileItems.h"
 #include "store/KSEventStore.h"
 
 namespace keepsakes {
@@ -21,19 +23,6 @@ namespace keepsakes {
 namespace {
 
 constexpr std::string_view kUnit = "KSSuggestedEventManager";
-
-/// The items that the store has for the query, or nothing when it fails.
-template <class Item, class Query>
-std::optional<std::vector<Item>> itemsOf(ProfileEventStore& store, const Query& query) {
-    std::vector<Item> items;
-    const auto error = store.iterateScoredEvents(query, [&items](const Item& item) {
-        items.push_back(item);
-        return true;
-    });
-    if (!error) return items;
-    logWarning(error->description());
-    return std::nullopt;
-}
 
 }  // namespace
 
@@ -68,7 +57,7 @@ std::shared_ptr<KSSuggestedEventManager> KSSuggestedEventManager::initWithProfil
 void KSSuggestedEventManager::_fetchTripsBetweenStartDate(
     KSDate start, KSDate end, std::function<void(const Trips&)> handler) {
     queue_.async([this, start, end, handler = std::move(handler)] {
-        const auto trips = itemsOf<Trip>(profileStore_, TripEventQuery{start, end});
+        const auto trips = profileItems<Trip>(profileStore_, TripEventQuery{start, end});
         if (trips) handler(*trips);
     });
 }
@@ -77,7 +66,7 @@ void KSSuggestedEventManager::fetchSuggestedEventBetweenStartDate(
     KSDate start, KSDate end, std::function<void(const SuggestedEvents&)> handler) {
     queue_.async([this, start, end, handler = std::move(handler)] {
         const auto suggested =
-            itemsOf<SuggestedEvent>(profileStore_, SuggestedEventQuery{start, end});
+            profileItems<SuggestedEvent>(profileStore_, SuggestedEventQuery{start, end});
         if (suggested) handler(*suggested);
     });
 }
@@ -105,14 +94,9 @@ void KSSuggestedEventManager::saveSuggestedEvents(const SuggestedEvents& suggest
     std::unordered_set<std::string> stored;
     for (const auto category : {KSEventCategory::structuredEvent, KSEventCategory::socialEvent}) {
         // A fetch that fails contributes nothing.
-        keepsakeStore_->fetchEventsWithStartDateAfter(
-            earliest, category, [&stored](const KSEventArray& events, const OptionalError&) {
-                for (const auto& event : events) {
-                    if (event->identifierFromProvider) {
-                        stored.insert(*event->identifierFromProvider);
-                    }
-                }
-            });
+        if (auto found = storedIdentifiers(*keepsakeStore_, earliest, category)) {
+            stored.merge(*found);
+        }
     }
     KSEventArray fresh;
     for (const auto& one : suggested) {
@@ -164,17 +148,15 @@ KSEventArray KSSuggestedEventManager::rehydratedSuggestedEvents(const KSEventArr
     const auto suggestions = suggestionsOfEvents(events);
     if (!suggestions) return {};
     std::vector<std::shared_ptr<KSEvent>> refreshed;
-    for (const auto& event : events) {
-        if (!event->identifierFromProvider) continue;
-        const auto found = suggestions->find(*event->identifierFromProvider);
-        if (found == suggestions->end()) continue;
-        auto filled = event->copy();
-        filled->identifierFromProvider = event->identifierFromProvider;
-        filled->suggestedEventIdentifier = event->suggestedEventIdentifier;
-        filled->suggestedEventTitle = found->second.title;
-        filled->suggestedEventCategory = static_cast<std::uint64_t>(found->second.category);
-        refreshed.push_back(std::move(filled));
-    }
+    forEachFoundIn(
+        *suggestions, events, [&refreshed](const KSEvent& event, const SuggestedEvent& suggested) {
+            auto filled = event.copy();
+            filled->identifierFromProvider = event.identifierFromProvider;
+            filled->suggestedEventIdentifier = event.suggestedEventIdentifier;
+            filled->suggestedEventTitle = suggested.title;
+            filled->suggestedEventCategory = static_cast<std::uint64_t>(suggested.category);
+            refreshed.push_back(std::move(filled));
+        });
     _enrichSuggestedEventsWithAlmanac(refreshed);
     return {refreshed.begin(), refreshed.end()};
 }
@@ -201,12 +183,7 @@ void KSSuggestedEventManager::removeSuggestedEventsDeletedAtSource(const KSEvent
         handler(std::nullopt, {});
         return;
     }
-    KSEventArray gone;
-    std::ranges::copy_if(events, std::back_inserter(gone), [&suggestions](const auto& event) {
-        const auto& identifier = event->identifierFromProvider;
-        return !identifier || !suggestions->contains(*identifier);
-    });
-    keepsakeStore_->removeEvents(gone, handler);
+    keepsakeStore_->removeEvents(eventsMissingIn(*suggestions, events), handler);
 }
 
 void KSSuggestedEventManager::waitForQueueEmpty() {
