@@ -35,71 +35,39 @@ EventSources::EventSources(const ServiceLookup& universe)
       nowPlayingMediaManager_(universe.service<KSNowPlayingMediaManager>("NowPlayingMediaManager")),
       significantContactManager_(
           universe.service<KSSignificantContactManager>("SignificantContactManager")) {
-    if (vitalsManager_) {
-        steps_.push_back({"resultWorkoutsSuccess",
-                          [source = vitalsManager_](KSDate start, KSDate end, ResultHandler done) {
-                              source->fetchAndSaveWorkoutsBetweenStartDate(start, end,
-                                                                           std::move(done));
-                          }});
-    }
-    if (routineServiceManager_) {
-        steps_.push_back(
-            {"resultVisitsSuccess",
-             [source = routineServiceManager_](KSDate start, KSDate end, ResultHandler done) {
-                 source->fetchAndSaveVisitsBetweenStartDate(start, end, std::move(done));
-             }});
-    }
-    if (photoManager_) {
-        steps_.push_back(
-            {"resultPhotosSuccess",
-             [source = photoManager_](KSDate start, KSDate end, const ResultHandler& done) {
-                 source->fetchAndSavePhotoKeepsakesBetweenStartDate(start, end, done);
-             }});
-    }
-    if (topicManager_) {
-        // Whatever the window is: of the day before its end.
-        steps_.push_back({"resultTopicsSuccess",
-                          [source = topicManager_](KSDate, KSDate end, ResultHandler done) {
-                              source->fetchAndSaveScoredTopicsBetweenStartDate(
-                                  KSTopicManager::startOfDayBefore(end),
-                                  KSTopicManager::endOfDayBefore(end), std::move(done));
-                          }});
-    }
-    if (linkshelfManager_) {
-        steps_.push_back(
-            {"resultSharedSuccess",
-             [source = linkshelfManager_](KSDate start, KSDate end, ResultHandler done) {
-                 source->fetchAndSaveSharedContentBetweenStartDate(start, end, std::move(done));
-             }});
-    }
-    if (suggestedEventManager_) {
-        steps_.push_back(
-            {"resultSuggestedSuccess",
-             [source = suggestedEventManager_](KSDate start, KSDate end, ResultHandler done) {
-                 source->fetchAndSaveSuggestedEventBetweenStartDate(start, end, std::move(done));
-             }});
-    }
-    if (foresightTravelManager_) {
-        steps_.push_back(
-            {"resultTripsSuccess",
-             [source = foresightTravelManager_](KSDate start, KSDate end, ResultHandler done) {
-                 source->fetchAndSaveTripsBetweenStartDate(start, end, std::move(done));
-             }});
-    }
-    if (nowPlayingMediaManager_) {
-        steps_.push_back(
-            {"resultMusicSuccess",
-             [source = nowPlayingMediaManager_](KSDate start, KSDate end, ResultHandler done) {
-                 source->fetchAndSaveRepeatedMediaPlayBetweenStartDate(start, end, std::move(done));
-             }});
-    }
-    if (significantContactManager_) {
-        steps_.push_back(
-            {"resultContactsSuccess",
-             [source = significantContactManager_](KSDate start, KSDate end, ResultHandler done) {
-                 source->fetchAndSaveConversationsBetweenStartDate(start, end, std::move(done));
-             }});
-    }
+    addStep("resultWorkoutsSuccess", vitalsManager_,
+            &KSVitalsManager::fetchAndSaveWorkoutsBetweenStartDate);
+    addStep("resultVisitsSuccess", routineServiceManager_,
+            &KSRoutineServiceManager::fetchAndSaveVisitsBetweenStartDate);
+    addStep("resultPhotosSuccess", photoManager_,
+            &KSPhotoManager::fetchAndSavePhotoKeepsakesBetweenStartDate);
+    // Whatever the window is: of the day before its end.
+    addStep("resultTopicsSuccess", topicManager_,
+            [](KSTopicManager& source, KSDate, KSDate end, ResultHandler done) {
+                source.fetchAndSaveScoredTopicsBetweenStartDate(
+                    KSTopicManager::startOfDayBefore(end), KSTopicManager::endOfDayBefore(end),
+                    std::move(done));
+            });
+    addStep("resultSharedSuccess", linkshelfManager_,
+            &KSLinkshelfManager::fetchAndSaveSharedContentBetweenStartDate);
+    addStep("resultSuggestedSuccess", suggestedEventManager_,
+            &KSSuggestedEventManager::fetchAndSaveSuggestedEventBetweenStartDate);
+    addStep("resultTripsSuccess", foresightTravelManager_,
+            &KSForesightTravelManager::fetchAndSaveTripsBetweenStartDate);
+    addStep("resultMusicSuccess", nowPlayingMediaManager_,
+            &KSNowPlayingMediaManager::fetchAndSaveRepeatedMediaPlayBetweenStartDate);
+    addStep("resultContactsSuccess", significantContactManager_,
+            &KSSignificantContactManager::fetchAndSaveConversationsBetweenStartDate);
+}
+
+template <class Source, class FetchAndSave>
+void EventSources::addStep(std::string_view successKey, const std::shared_ptr<Source>& source,
+                           FetchAndSave fetchAndSave) {
+    if (!source) return;
+    steps_.push_back(
+        {successKey, [source, fetchAndSave](KSDate start, KSDate end, ResultHandler done) {
+             std::invoke(fetchAndSave, *source, start, end, std::move(done));
+         }});
 }
 
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,

@@ -50,6 +50,11 @@ class EventSources {
     void _rehydrateEventsBySingleSource(const KSEventArray& group, EventsHandler handler) const;
 
   private:
+    /// For a source that is registered.
+    template <class Source, class FetchAndSave>
+    void addStep(std::string_view successKey, const std::shared_ptr<Source>& source,
+                 FetchAndSave fetchAndSave);
+
     std::shared_ptr<KSVitalsManager> vitalsManager_;
     std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
     std::shared_ptr<KSPhotoManager> photoManager_;
