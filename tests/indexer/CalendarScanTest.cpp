@@ -6,10 +6,10 @@
 
 #include <fstream>
 
+#include "ScanOnce.h"
 #include "devicedata/IndexedCalendarService.h"
 #include "devicedata/IndexedProfileEventStore.h"
 #include "indexer/ContentReader.h"
-#include "indexer/FolderScan.h"
 #include "indexer/TripRule.h"
 #include "support/TemporaryFolder.h"
 
@@ -99,29 +99,15 @@ TEST_F(TripRule, TitlesReadAsPeopleSayThem) {
                 ElementsAre("Away, 30 December 2023 to 3 May 2024: 14:00|14:00"));
 }
 
-class SilentReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { problems.push_back(line); }
-    void report(const ScanSummary& done) override { summary = done; }
-    ScanSummary summary;
-    std::vector<std::string> problems;
-};
-
 class CalendarScan : public OwnerInVienna {
   protected:
-    SilentReporter scan(KSDate now = kNow) {
-        SilentReporter reporter;
-        const auto mark = ReadMark::take(index_.string() + ".scan");
-        EXPECT_TRUE(mark);
-        const auto error = scanFolders({.index = index_,
-                                        .tracks = {},
-                                        .photos = {},
-                                        .calendars = {folder_.path()},
-                                        .now = now},
-                                       reader_, **mark, reporter);
-        EXPECT_FALSE(error) << error->description();
-        return reporter;
+    ScanOutcome scan(KSDate now = kNow) {
+        return scanOnce({.index = index_,
+                         .tracks = {},
+                         .photos = {},
+                         .calendars = {folder_.path()},
+                         .now = now},
+                        reader_);
     }
 
     /// Replaces the file as calendar programs do: under another name first.

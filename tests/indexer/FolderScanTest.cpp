@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <fstream>
 
+#include "ScanOnce.h"
 #include "TextReader.h"
 #include "devicedata/IndexedHealthStore.h"
 #include "devicedata/IndexedPhotoAnalysis.h"
@@ -24,16 +25,6 @@ using testing::HasSubstr;
 using testing::IsEmpty;
 using testing::UnorderedElementsAre;
 
-class RecordingReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { problems.push_back(line); }
-    void report(const ScanSummary& done) override { summary = done; }
-
-    std::vector<std::string> problems;
-    std::optional<ScanSummary> summary;
-};
-
 struct Occasion {
     std::string identifier;
     std::int64_t photos = 0;
@@ -49,17 +40,11 @@ class FolderScan : public testing::Test {
         fs::create_directories(photos_);
     }
 
-    /// Scans once, as a process of its own would; the files read are then in `reader_.reads`.
-    RecordingReporter scan() {
+    /// The files read are then in `reader_.reads`.
+    ScanOutcome scan() {
         reader_.reads.clear();
-        RecordingReporter reporter;
-        const auto mark = ReadMark::take(index_.string() + ".scan");
-        EXPECT_TRUE(mark);
-        const auto error = scanFolders(
-            {.index = index_, .tracks = {tracks_}, .photos = {photos_}, .now = {now_++}}, reader_,
-            **mark, reporter);
-        EXPECT_FALSE(error) << error->description();
-        return reporter;
+        return scanOnce(
+            {.index = index_, .tracks = {tracks_}, .photos = {photos_}, .now = {now_++}}, reader_);
     }
 
     std::vector<double> workoutStarts() {
@@ -113,16 +98,16 @@ TEST_F(FolderScan, ReadsWhatChangedAndForgetsWhatIsGone) {
     folder_.write("Tracks/a.gpx", "workout 100 200 24");
     folder_.write("Tracks/deep/er/b.gpx", "workout 300 400 24");
     folder_.write("Tracks/notes.txt", "nothing");
-    EXPECT_EQ(scan().summary->read, 3u);
+    EXPECT_EQ(scan().summary.read, 3u);
     EXPECT_THAT(workoutStarts(), ElementsAre(300, 100));
     const auto unchanged = scan();
     EXPECT_THAT(reader_.reads, IsEmpty());
-    EXPECT_FALSE(unchanged.summary->changed);
-    EXPECT_EQ(unchanged.summary->totals.files, 3u);
+    EXPECT_FALSE(unchanged.summary.changed);
+    EXPECT_EQ(unchanged.summary.totals.files, 3u);
 
     folder_.write("Tracks/a.gpx", "workout 150 200 24\n");
     fs::remove_all(tracks_ / "deep");
-    EXPECT_EQ(scan().summary->removed, 1u);
+    EXPECT_EQ(scan().summary.removed, 1u);
     EXPECT_THAT(reader_.reads, ElementsAre("workout 150 200 24\n"));
     EXPECT_THAT(workoutStarts(), ElementsAre(150));
 }
@@ -158,7 +143,7 @@ TEST_F(FolderScan, PassesOverWhatIsNoFileOfTheOwners) {
     folder_.write(deep + "/deep.gpx", "workout 5 6 24");
     const auto reporter = scan();
     EXPECT_THAT(workoutStarts(), ElementsAre(100));
-    EXPECT_EQ(reporter.summary->totals.files, 2u);
+    EXPECT_EQ(reporter.summary.totals.files, 2u);
     EXPECT_THAT(reporter.problems, ElementsAre(HasSubstr("caf\\xe9\\x0a.gpx: with \\x01 bytes"),
                                                HasSubstr("too deep")));
 }
@@ -170,7 +155,7 @@ TEST_F(FolderScan, AMovedFileKeepsItsRecordsUnread) {
     fs::create_directories(photos_ / "album");
     fs::rename(original, photos_ / "album" / "b.jpg");
     const auto reporter = scan();
-    EXPECT_EQ(reporter.summary->renamed, 1u);
+    EXPECT_EQ(reporter.summary.renamed, 1u);
     EXPECT_THAT(reader_.reads, IsEmpty());
     EXPECT_EQ(identifiers(), before);
     // Same size, other content: no move.
@@ -201,9 +186,9 @@ TEST_F(FolderScan, ARefusedFileIsNamedAndNotReadAgainUntilItChanges) {
     const auto again = scan();
     EXPECT_THAT(reader_.reads, IsEmpty());
     EXPECT_EQ(again.problems, problems);
-    EXPECT_EQ(again.summary->totals.refused, 2u);
+    EXPECT_EQ(again.summary.totals.refused, 2u);
     folder_.write("Tracks/bad.gpx", "workout 100 200 24");
-    EXPECT_EQ(scan().summary->totals.refused, 1u);
+    EXPECT_EQ(scan().summary.totals.refused, 1u);
     EXPECT_THAT(workoutStarts(), ElementsAre(100));
 }
 

@@ -4,9 +4,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "ScanOnce.h"
 #include "devicedata/IndexedSearchIndex.h"
 #include "indexer/ContentReader.h"
-#include "indexer/FolderScan.h"
 #include "support/TemporaryFolder.h"
 
 namespace keepsakes {
@@ -22,13 +22,6 @@ const std::string kLinks = "com_brindle_parley_indexType=\"lnk\" && URL=* && ";
 const std::string kDates =
     "InRange(contentCreationDate, iso(2024-06-01T00:00:00Z), iso(2024-06-15T00:00:00Z))";
 
-class QuietReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { ADD_FAILURE() << line; }
-    void report(const ScanSummary&) override {}
-};
-
 std::string mail(int day, const std::string& from, const std::string& to, const std::string& text) {
     return fmt::format(
         "From: {}\nTo: {}\nDate: {} Jun 2024 08:00:00 +0000\nMessage-ID: <{}@x>\n\n{}\n", from, to,
@@ -43,20 +36,18 @@ class LinkScan : public testing::Test {
     }
 
     void scan() {
-        QuietReporter reporter;
         ContentReader reader;
-        const auto mark = ReadMark::take(index_.string() + ".scan");
-        const auto error = scanFolders({.index = index_,
-                                        .tracks = {},
-                                        .photos = {},
-                                        .places = {},
-                                        .gazetteer = {},
-                                        .messages = {folder_ / "Mail"},
-                                        .contacts = {folder_ / "Contacts"},
-                                        .ownerAddresses = {"me@x.org"},
-                                        .now = kNow},
-                                       reader, **mark, reporter);
-        EXPECT_FALSE(error) << error->description();
+        const auto done = scanOnce({.index = index_,
+                                    .tracks = {},
+                                    .photos = {},
+                                    .places = {},
+                                    .gazetteer = {},
+                                    .messages = {folder_ / "Mail"},
+                                    .contacts = {folder_ / "Contacts"},
+                                    .ownerAddresses = {"me@x.org"},
+                                    .now = kNow},
+                                   reader);
+        EXPECT_THAT(done.problems, IsEmpty());
     }
 
     std::vector<SearchableItem> items(const std::string& query,

@@ -7,12 +7,12 @@
 #include <cmath>
 #include <fstream>
 
+#include "ScanOnce.h"
 #include "devicedata/IndexedContactStore.h"
 #include "devicedata/IndexedInteractionStore.h"
 #include "indexer/AddressBook.h"
 #include "indexer/ContactRanking.h"
 #include "indexer/ContentReader.h"
-#include "indexer/FolderScan.h"
 #include "support/TemporaryFolder.h"
 
 namespace keepsakes {
@@ -41,19 +41,6 @@ class CountingReader final : public FileReader {
     ContentReader reader_;
 };
 
-class SilentReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t done, std::uint64_t total) override {
-        most = std::max(most, done);
-        EXPECT_LE(done, total);
-    }
-    void problem(const std::string& line) override { problems.push_back(line); }
-    void report(const ScanSummary& done) override { summary = done; }
-    ScanSummary summary;
-    std::vector<std::string> problems;
-    std::uint64_t most = 0;
-};
-
 /// Noon of 2024-06-15; what the files tell lies in the days before.
 const KSDate kNow = parseISO8601("2024-06-15T12:00:00Z")->date;
 
@@ -75,21 +62,16 @@ class PeopleScan : public testing::Test {
         for (const auto* name : {"Mail", "Contacts"}) fs::create_directories(folder_ / name);
     }
 
-    SilentReporter scan(std::vector<std::string> owner = {}, KSDate now = kNow) {
+    ScanOutcome scan(std::vector<std::string> owner = {}, KSDate now = kNow) {
         reader_.reads = 0;
-        SilentReporter reporter;
-        const auto mark = ReadMark::take(index_.string() + ".scan");
-        EXPECT_TRUE(mark);
-        const auto error = scanFolders({.index = index_,
-                                        .tracks = {},
-                                        .photos = {},
-                                        .messages = {folder_ / "Mail"},
-                                        .contacts = {folder_ / "Contacts"},
-                                        .ownerAddresses = std::move(owner),
-                                        .now = now},
-                                       reader_, **mark, reporter);
-        EXPECT_FALSE(error) << error->description();
-        return reporter;
+        return scanOnce({.index = index_,
+                         .tracks = {},
+                         .photos = {},
+                         .messages = {folder_ / "Mail"},
+                         .contacts = {folder_ / "Contacts"},
+                         .ownerAddresses = std::move(owner),
+                         .now = now},
+                        reader_);
     }
 
     static std::string shown(const InteractionPerson& person) {
@@ -264,21 +246,19 @@ TEST_F(PeopleScan, ALargeMailboxGivesSignsOfGoingOn) {
                  std::string(100000, 'x') + "\n\n";
     }
     folder_.write("Mail/Inbox", mails);
-    EXPECT_GE(scan().most, 4u);
+    EXPECT_GE(scan().mostDone, 4u);
 }
 
 TEST_F(PeopleScan, AStandardFolderMayBeMissingUntilItWasThere) {
     const auto scanOf = [this](const fs::path& standard) {
-        SilentReporter reporter;
-        const auto mark = ReadMark::take(index_.string() + ".scan");
-        EXPECT_FALSE(scanFolders({.index = index_,
-                                  .tracks = {folder_ / "Tracks"},
-                                  .photos = {},
-                                  .messages = {folder_ / "Post"},
-                                  .standardFolders = {standard},
-                                  .now = kNow},
-                                 reader_, **mark, reporter));
-        return reporter.problems;
+        return scanOnce({.index = index_,
+                         .tracks = {folder_ / "Tracks"},
+                         .photos = {},
+                         .messages = {folder_ / "Post"},
+                         .standardFolders = {standard},
+                         .now = kNow},
+                        reader_)
+            .problems;
     };
     EXPECT_THAT(scanOf(folder_ / "Post"), ElementsAre(HasSubstr("Tracks")));
     folder_.write("Post/1", mail(10, "a@x.org", "b@x.org"));

@@ -8,9 +8,9 @@
 #include <fstream>
 #include <random>
 
+#include "ScanOnce.h"
 #include "TextReader.h"
 #include "devicedata/IndexedRoutineService.h"
-#include "indexer/FolderScan.h"
 #include "support/TemporaryFolder.h"
 #include "support/VirtualClock.h"
 
@@ -24,31 +24,20 @@ using testing::IsEmpty;
 
 constexpr double kDay = 86400;
 
-class SilentReporter final : public ScanReporter {
-  public:
-    void progress(std::uint64_t, std::uint64_t) override {}
-    void problem(const std::string& line) override { problems.push_back(line); }
-    void report(const ScanSummary&) override {}
-    std::vector<std::string> problems;
-};
-
 class VisitScan : public testing::Test {
   protected:
     std::vector<std::string> scan() { return scanInto(index_); }
 
     std::vector<std::string> scanInto(const fs::path& index) {
         reader_.reads.clear();
-        SilentReporter reporter;
-        const auto mark = ReadMark::take(index.string() + ".scan");
-        const auto error = scanFolders({.index = index,
-                                        .tracks = {folder_ / "Tracks"},
-                                        .photos = {},
-                                        .places = {},
-                                        .gazetteer = gazetteer_,
-                                        .now = {now_ += 1}},
-                                       reader_, **mark, reporter);
-        EXPECT_FALSE(error) << error->description();
-        return reporter.problems;
+        return scanOnce({.index = index,
+                         .tracks = {folder_ / "Tracks"},
+                         .photos = {},
+                         .places = {},
+                         .gazetteer = gazetteer_,
+                         .now = {now_ += 1}},
+                        reader_)
+            .problems;
     }
 
     std::vector<RoutineVisit> visitsOf(const fs::path& index) {
