@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <string>
 
+#include "FoldedLines.h"
 #include "PeopleCheck.h"
 #include "readers/CalendarReader.h"
 
@@ -28,19 +29,6 @@ constexpr std::string_view kSeeds[] = {
     "\"LodgingReservation\"\\,\"checkinTime\":\"2024-06-10T15:00:00+02:00\"}]\nEND:VEVENT\n"
     "END:VCALENDAR\n",
 };
-
-/// Each line that is not folded yet, broken behind its first byte.
-std::string folded(std::string_view text) {
-    std::string result;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        result += text[i];
-        const bool isFirst = i == 0 || text[i - 1] == '\n';
-        const bool isPlain =
-            text[i] != ' ' && text[i] != '\t' && text[i] != '\r' && text[i] != '\n';
-        if (isFirst && isPlain) result += "\r\n ";
-    }
-    return result;
-}
 
 void checkRecords(const FileRecords& records) {
     for (const auto& one : records.occurrences) {

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <string>
 
+#include "FoldedLines.h"
 #include "PeopleCheck.h"
 #include "readers/ContactReader.h"
 
@@ -21,19 +22,6 @@ constexpr std::string_view kSeeds[] = {
     "t:x.org\nTEL;VALUE=uri:tel:+1-"
     "555-5551234\nGEO:geo:1,2;u=3\nKIND:individual\nEND:VCARD\n",
 };
-
-/// Each line that is not folded yet, broken behind its first byte.
-std::string folded(std::string_view text) {
-    std::string result;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        result += text[i];
-        const bool isFirst = i == 0 || text[i - 1] == '\n';
-        const bool isPlain =
-            text[i] != ' ' && text[i] != '\t' && text[i] != '\r' && text[i] != '\n';
-        if (isFirst && isPlain) result += "\r\n ";
-    }
-    return result;
-}
 
 }  // namespace
 
