@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "collect/SourceRouting.h"
 
+#include <type_traits>
 #include <utility>
 
 #include "sources/KSForesightTravelManager.h"
@@ -14,15 +15,6 @@
 #include "sources/KSVitalsManager.h"
 
 namespace keepsakes {
-
-namespace {
-
-/// A trends event has the category of what it tells of, and no source.
-bool hasNoSource(const KSEventArray& group) {
-    return group.front()->provider() == KSEventProvider::postAnalytics;
-}
-
-}  // namespace
 
 EventSources::EventSources(const ServiceLookup& universe)
     : vitalsManager_(universe.service<KSVitalsManager>("VitalsManager")),
@@ -58,6 +50,31 @@ EventSources::EventSources(const ServiceLookup& universe)
             &KSNowPlayingMediaManager::fetchAndSaveRepeatedMediaPlayBetweenStartDate);
     addStep("resultContactsSuccess", significantContactManager_,
             &KSSignificantContactManager::fetchAndSaveConversationsBetweenStartDate);
+
+    addRoute({KSEventCategory::visit}, routineServiceManager_,
+             &KSRoutineServiceManager::removeVisitsDeletedAtSource,
+             &KSRoutineServiceManager::rehydrateVisits);
+    addRoute({KSEventCategory::photoKeepsake}, photoManager_,
+             &KSPhotoManager::removePhotoEventsDeletedAtSource,
+             &KSPhotoManager::rehydratePhotoKeepsakes);
+    addRoute({KSEventCategory::topic}, topicManager_, nullptr,
+             &KSTopicManager::rehydratedScoredTopicsEvents);
+    addRoute({KSEventCategory::mediaOnRepeat, KSEventCategory::leisureMedia},
+             nowPlayingMediaManager_,
+             &KSNowPlayingMediaManager::removeMediaPlayEventsDeletedAtSource,
+             &KSNowPlayingMediaManager::rehydratedMediaPlayEvents);
+    addRoute({KSEventCategory::linkshelf}, linkshelfManager_,
+             &KSLinkshelfManager::removeSharedContentsDeletedAtSource,
+             &KSLinkshelfManager::rehydratedSharedContentEvents);
+    addRoute({KSEventCategory::travel}, foresightTravelManager_,
+             &KSForesightTravelManager::removeTripEventsDeletedAtSource,
+             &KSForesightTravelManager::rehydratedTripEvents);
+    addRoute({KSEventCategory::structuredEvent, KSEventCategory::socialEvent},
+             suggestedEventManager_, &KSSuggestedEventManager::removeSuggestedEventsDeletedAtSource,
+             &KSSuggestedEventManager::rehydratedSuggestedEvents);
+    addRoute({KSEventCategory::significantContact}, significantContactManager_,
+             &KSSignificantContactManager::removeConversationsDeletedAtSource,
+             &KSSignificantContactManager::rehydrateConversations);
 }
 
 template <class Source, class FetchAndSave>
@@ -70,124 +87,52 @@ void EventSources::addStep(std::string_view successKey, const std::shared_ptr<So
          }});
 }
 
+template <class Source, class Purge, class Rehydrate>
+void EventSources::addRoute(std::initializer_list<KSEventCategory> categories,
+                            const std::shared_ptr<Source>& source, Purge purge,
+                            Rehydrate rehydrate) {
+    if (!source) return;
+    Route route;
+    if constexpr (!std::is_null_pointer_v<Purge>) {
+        route.purge = [source, purge](const KSEventArray& group, ResultHandler handler) {
+            std::invoke(purge, *source, group, std::move(handler));
+        };
+    }
+    route.rehydrate = [source, rehydrate](const KSEventArray& group, EventsHandler handler) {
+        if constexpr (std::is_invocable_v<Rehydrate, Source&, const KSEventArray&>) {
+            handler(std::invoke(rehydrate, *source, group), std::nullopt);
+        } else {
+            std::invoke(rehydrate, *source, group, std::move(handler));
+        }
+    };
+    for (const auto category : categories) routes_.emplace(category, route);
+}
+
+const EventSources::Route* EventSources::routeOf(const KSEventArray& group) const {
+    const auto& event = *group.front();
+    // A trends event has the category of what it tells of, and no source.
+    if (event.provider() == KSEventProvider::postAnalytics) return nullptr;
+    const auto found = routes_.find(event.category());
+    return found == routes_.end() ? nullptr : &found->second;
+}
+
 void EventSources::_purgeEventsDeletedAtSingleSource(const KSEventArray& group,
                                                      ResultHandler handler) const {
-    if (hasNoSource(group)) {
+    const auto* route = routeOf(group);
+    if (route && route->purge) {
+        route->purge(group, std::move(handler));
+    } else {
         handler(std::nullopt, {});
-        return;
     }
-    switch (group.front()->category()) {
-        case KSEventCategory::visit:
-            if (routineServiceManager_) {
-                routineServiceManager_->removeVisitsDeletedAtSource(group, std::move(handler));
-                return;
-            }
-            break;
-        case KSEventCategory::photoKeepsake:
-            if (photoManager_) {
-                photoManager_->removePhotoEventsDeletedAtSource(group, std::move(handler));
-                return;
-            }
-            break;
-        case KSEventCategory::mediaOnRepeat:
-        case KSEventCategory::leisureMedia:
-            if (nowPlayingMediaManager_) {
-                nowPlayingMediaManager_->removeMediaPlayEventsDeletedAtSource(group, handler);
-                return;
-            }
-            break;
-        case KSEventCategory::linkshelf:
-            if (linkshelfManager_) {
-                linkshelfManager_->removeSharedContentsDeletedAtSource(group, handler);
-                return;
-            }
-            break;
-        case KSEventCategory::travel:
-            if (foresightTravelManager_) {
-                foresightTravelManager_->removeTripEventsDeletedAtSource(group, handler);
-                return;
-            }
-            break;
-        case KSEventCategory::structuredEvent:
-        case KSEventCategory::socialEvent:
-            if (suggestedEventManager_) {
-                suggestedEventManager_->removeSuggestedEventsDeletedAtSource(group, handler);
-                return;
-            }
-            break;
-        case KSEventCategory::significantContact:
-            if (significantContactManager_) {
-                significantContactManager_->removeConversationsDeletedAtSource(group, handler);
-                return;
-            }
-            break;
-        default:
-            break;
-    }
-    handler(std::nullopt, {});
 }
 
 void EventSources::_rehydrateEventsBySingleSource(const KSEventArray& group,
                                                   EventsHandler handler) const {
-    if (hasNoSource(group)) {
+    if (const auto* route = routeOf(group)) {
+        route->rehydrate(group, std::move(handler));
+    } else {
         handler(group, std::nullopt);
-        return;
     }
-    switch (group.front()->category()) {
-        case KSEventCategory::visit:
-            if (routineServiceManager_) {
-                routineServiceManager_->rehydrateVisits(group, std::move(handler));
-                return;
-            }
-            break;
-        case KSEventCategory::photoKeepsake:
-            if (photoManager_) {
-                photoManager_->rehydratePhotoKeepsakes(group, std::move(handler));
-                return;
-            }
-            break;
-        case KSEventCategory::topic:
-            if (topicManager_) {
-                handler(topicManager_->rehydratedScoredTopicsEvents(group), std::nullopt);
-                return;
-            }
-            break;
-        case KSEventCategory::mediaOnRepeat:
-        case KSEventCategory::leisureMedia:
-            if (nowPlayingMediaManager_) {
-                handler(nowPlayingMediaManager_->rehydratedMediaPlayEvents(group), std::nullopt);
-                return;
-            }
-            break;
-        case KSEventCategory::linkshelf:
-            if (linkshelfManager_) {
-                handler(linkshelfManager_->rehydratedSharedContentEvents(group), std::nullopt);
-                return;
-            }
-            break;
-        case KSEventCategory::travel:
-            if (foresightTravelManager_) {
-                handler(foresightTravelManager_->rehydratedTripEvents(group), std::nullopt);
-                return;
-            }
-            break;
-        case KSEventCategory::structuredEvent:
-        case KSEventCategory::socialEvent:
-            if (suggestedEventManager_) {
-                handler(suggestedEventManager_->rehydratedSuggestedEvents(group), std::nullopt);
-                return;
-            }
-            break;
-        case KSEventCategory::significantContact:
-            if (significantContactManager_) {
-                handler(significantContactManager_->rehydrateConversations(group), std::nullopt);
-                return;
-            }
-            break;
-        default:
-            break;
-    }
-    handler(group, std::nullopt);
 }
 
 }  // namespace keepsakes

@@ -2,6 +2,8 @@
 #pragma once
 
 #include <functional>
+#include <initializer_list>
+#include <map>
 #include <memory>
 #include <string_view>
 #include <vector>
@@ -50,10 +52,21 @@ class EventSources {
     void _rehydrateEventsBySingleSource(const KSEventArray& group, EventsHandler handler) const;
 
   private:
-    /// For a source that is registered.
+    /// What the source of a category does with a group of its events.
+    struct Route {
+        std::function<void(const KSEventArray&, ResultHandler)> purge;  ///< None: left alone.
+        std::function<void(const KSEventArray&, EventsHandler)> rehydrate;
+    };
+
+    // Both for a source that is registered alone.
     template <class Source, class FetchAndSave>
     void addStep(std::string_view successKey, const std::shared_ptr<Source>& source,
                  FetchAndSave fetchAndSave);
+    template <class Source, class Purge, class Rehydrate>
+    void addRoute(std::initializer_list<KSEventCategory> categories,
+                  const std::shared_ptr<Source>& source, Purge purge, Rehydrate rehydrate);
+
+    const Route* routeOf(const KSEventArray& group) const;
 
     std::shared_ptr<KSVitalsManager> vitalsManager_;
     std::shared_ptr<KSRoutineServiceManager> routineServiceManager_;
@@ -65,6 +78,7 @@ class EventSources {
     std::shared_ptr<KSNowPlayingMediaManager> nowPlayingMediaManager_;
     std::shared_ptr<KSSignificantContactManager> significantContactManager_;
     std::vector<CollectionStep> steps_;
+    std::map<KSEventCategory, Route> routes_;
 };
 
 }  // namespace keepsakes
