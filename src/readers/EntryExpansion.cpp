@@ -116,6 +116,10 @@ void EntryExpansion::put(const CalendarEntry& entry, const Placed& placed, std::
         leaveOut("a date that is not believed");
         return;
     }
+    if (recurs && records.occurrences.size() >= limits::kMostOccurrencesOfFile) {
+        leaveOut("an occurrence beyond those that a file may have");
+        return;
+    }
     CalendarOccurrence occurrence{.identifier = std::move(identifier),
                                   .start = placed.start,
                                   .end = placed.end,

@@ -104,6 +104,8 @@ inline constexpr std::size_t kMostEntries = 100000;
 /// days.
 inline constexpr std::size_t kMostOccurrences = 2000;
 inline constexpr std::size_t kMostRuleSteps = 400000;
+/// Records of one file from which on no more occurrences of recurring entries are added.
+inline constexpr std::size_t kMostOccurrencesOfFile = 100000;
 /// Recurring entries are followed so many seconds back from the scan (two years and more) and
 /// ahead (a year and more); the file is read again before that window is used up.
 inline constexpr double kRecurrenceBack = 800 * 86400.0;

@@ -140,6 +140,17 @@ TEST_F(CalendarReader, BoundsWhatRecursForAges) {
                     StartsWith("u/20240610T100000Z"))
             << rule;
     }
+    std::string many;
+    for (int i = 0; i < 84; ++i) {
+        many += fmt::format(
+            "BEGIN:VEVENT\r\nUID:{}\r\nDTSTART:20200610T100000Z\r\nRRULE:FREQ=DAILY\r\n"
+            "END:VEVENT\r\n",
+            i);
+    }
+    const auto text = occurrencesIn(calendarOf(many + entryOf("DTSTART:20240610T100000Z\r\n")));
+    EXPECT_THAT(text, HasSubstr("\nu 2024-06-10T10")) << "what happens once is kept";
+    EXPECT_THAT(text,
+                HasSubstr("! left out: an occurrence beyond those that a file may have (800)"));
 }
 
 TEST_F(CalendarReader, LeavesOutWhatIsCancelledOrSaidAnew) {
