@@ -112,6 +112,9 @@ constexpr auto kRuleSubjects = std::to_array<Phrase>({
     {"HikingPlusPhotos", "mountain"},
 });
 
+/// What a cluster that goes on during a trip is called.
+constexpr std::string_view kTripSentence = "On a trip";
+
 /// What a cluster of nothing else but topics, or media, is called.
 constexpr std::string_view kTopicSentence = "What the day was about";
 constexpr std::string_view kMediaSentence = "Watched or listened to";
@@ -121,6 +124,9 @@ constexpr std::string_view kPlannedSentence = "Planned";
 
 /// What a cluster of nothing else but links is called.
 constexpr std::string_view kLinksSentence = "Links shared with you";
+constexpr std::string_view kLinkSentence = "A link shared with you";
+constexpr std::string_view kOwnLinksSentence = "Links you shared";
+constexpr std::string_view kOwnLinkSentence = "A link you shared";
 
 /// What a finding of an analysis is called.
 constexpr std::string_view kTrendSentence = "A trend";
@@ -132,6 +138,10 @@ std::string timeText(KSDateInterval span) {
     const auto day = calendar::format(span.start, kDay);
     const auto from = calendar::format(span.start, kTime);
     const auto to = calendar::format(span.end, kTime);
+    if (calendar::isWholeDays(span)) {
+        const auto last = calendar::format(span.end - 1, kDay);
+        return last == day ? day : fmt::format("{} to {}", day, last);
+    }
     if (calendar::startOfDay(span.start) != calendar::startOfDay(span.end)) {
         return fmt::format("{} {} to {} {}", day, from, calendar::format(span.end, kDay), to);
     }
@@ -238,9 +248,16 @@ std::string_view headline(const KSEventBundle& bundle) {
     }
     if (std::ranges::all_of(bundle.events, isMedia)) return kMediaSentence;
     if (std::ranges::all_of(bundle.events, hasTopics)) return kTopicSentence;
-    if (std::ranges::all_of(bundle.events, isLink)) return kLinksSentence;
+    if (std::ranges::all_of(bundle.events, isLink)) {
+        const bool one = bundle.events.size() == 1;
+        const bool own = std::ranges::all_of(bundle.events,
+                                             [](const auto& event) { return event->itemIsShared; });
+        if (own) return one ? kOwnLinkSentence : kOwnLinksSentence;
+        return one ? kLinkSentence : kLinksSentence;
+    }
     if (std::ranges::all_of(bundle.events, isSocial)) return kSocialSentence;
     if (std::ranges::all_of(bundle.events, isSuggested)) return kPlannedSentence;
+    if (holds(bundle, KSEventCategory::travel)) return kTripSentence;
     const bool workout = holds(bundle, KSEventCategory::workout);
     const bool photos = holds(bundle, KSEventCategory::photoKeepsake);
     const bool visit = holds(bundle, KSEventCategory::visit);

@@ -2,9 +2,11 @@
 #include "client/Commands.h"
 
 #include <fmt/format.h>
+#include <fmt/ranges.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstdio>
 #include <iostream>
@@ -24,6 +26,11 @@ namespace keepsakes {
 namespace {
 
 constexpr std::string_view kMinutePattern = "yyyy-MM-dd HH:mm";
+constexpr std::string_view kDayPattern = "yyyy-MM-dd";
+
+std::string counted(std::size_t count, std::string_view what) {
+    return fmt::format("{} {}{}", count, what, count == 1 ? "" : "s");
+}
 
 std::string shown(std::optional<KSDate> date) {
     if (!date || date->seconds <= KSDate::kDistantPast || date->seconds >= KSDate::kDistantFuture) {
@@ -32,8 +39,18 @@ std::string shown(std::optional<KSDate> date) {
     return calendar::format(*date, kMinutePattern);
 }
 
+/// Whole days go without times.
+std::string shownStart(KSDate start, KSDate end) {
+    return calendar::isWholeDays({start, end}) ? calendar::format(start, kDayPattern)
+                                               : shown(start);
+}
+
 /// The end without its day when that is the start's.
 std::string shownEnd(KSDate start, KSDate end) {
+    if (calendar::isWholeDays({start, end})) {
+        const auto last = calendar::startOfDay(end - 1);
+        return last > start ? calendar::format(last, kDayPattern) : "all day";
+    }
     const bool sameDay = calendar::startOfDay(start) == calendar::startOfDay(end);
     return sameDay ? calendar::format(end, "HH:mm") : shown(end);
 }
@@ -80,6 +97,39 @@ std::string topicsText(const KSDictionary& scoredTopics) {
     return text;
 }
 
+/// What photos show, as people write it, by inference word; the others are written so.
+struct PhotoWord {
+    std::string_view inference;
+    std::string_view word;
+};
+constexpr auto kPhotoWords = std::to_array<PhotoWord>({
+    {"amusementpark", "amusement park"},
+    {"beaching", "beach"},
+    {"frequentlocation", "favourite place"},
+    {"holidayevent", "holiday"},
+    {"nightout", "night out"},
+    {"sportevent", "sports event"},
+    {"wintersport", "winter sports"},
+});
+
+/// What the photos show and whom: "wedding, celebration; with Anna Beispiel".
+std::string photosText(const KSEventExtendedAttributes& photos) {
+    std::vector<std::string> words;
+    for (const auto& inference :
+         photos.photoKeepsakeInferences.value_or(std::vector<std::string>())) {
+        const auto* known = std::ranges::find(kPhotoWords, inference, &PhotoWord::inference);
+        auto word = known == kPhotoWords.end() ? inference : std::string(known->word);
+        if (std::ranges::find(words, word) == words.end()) words.push_back(std::move(word));
+    }
+    std::vector<std::string> people;
+    for (const auto& person : photos.photoKeepsakePersons.value_or(std::vector<KSPerson>())) {
+        if (person.name && !person.name->empty()) people.push_back(*person.name);
+    }
+    auto text = fmt::format("{}", fmt::join(words, ", "));
+    if (people.empty()) return text;
+    return fmt::format("{}{}with {}", text, text.empty() ? "" : "; ", fmt::join(people, ", "));
+}
+
 /// What tells one event from another of its kind.
 std::string detailsOf(const KSEvent& event) {
     std::string details;
@@ -109,14 +159,8 @@ std::string detailsOf(const KSEvent& event) {
         if (contact.score) add(fmt::format("score {:.2f}", *contact.score));
     }
     if (event.scoredTopics) add(topicsText(*event.scoredTopics));
-    if (const auto& photos = event.extendedAttributes) {
-        for (const auto& word :
-             photos->photoKeepsakeInferences.value_or(std::vector<std::string>())) {
-            add(word);
-        }
-        for (const auto& person : photos->photoKeepsakePersons.value_or(std::vector<KSPerson>())) {
-            add(person.name);
-        }
+    if (event.extendedAttributes) {
+        add(photosText(*event.extendedAttributes));
         return details;
     }
     if (details.empty()) add(event.identifierFromProvider);
@@ -126,14 +170,11 @@ std::string detailsOf(const KSEvent& event) {
 std::string eventTable(const KSEventArray& events, const Screen& screen, std::size_t indent = 0) {
     Table table({"Start", "End", "Category", "Provider", "Details"});
     for (const auto& event : events) {
-        table.add({shown(event->startDate()), shownEnd(event->startDate(), event->endDate()),
-                   event->describeCategory(), event->describeProvider(), detailsOf(*event)});
+        table.add({shownStart(event->startDate(), event->endDate()),
+                   shownEnd(event->startDate(), event->endDate()), event->describeCategory(),
+                   event->describeProvider(), detailsOf(*event)});
     }
     return table.text(screen, indent);
-}
-
-std::string counted(std::size_t count, std::string_view what) {
-    return fmt::format("{} {}{}", count, what, count == 1 ? "" : "s");
 }
 
 /// Fills what both kinds of options share; the text of a usage error, or none.
@@ -155,6 +196,21 @@ std::optional<std::string> readWords(const FetchWords& words, Options& options) 
     return std::nullopt;
 }
 
+KSArray arrayOf(const std::vector<std::string>& texts) { return {texts.begin(), texts.end()}; }
+
+/// "9 sources answered", "8 sources answered, but not Topics".
+std::string sourcesText(const DaemonStatus& status) {
+    auto text = fmt::format("{} answered", counted(status.sourcesAnswered.size(), "source"));
+    for (const auto& name : status.sourcesFailed) {
+        text += (name == status.sourcesFailed.front() ? ", but not " : ", ") + printable(name);
+    }
+    return text;
+}
+
+bool hasCollected(const DaemonStatus& status) {
+    return !status.sourcesAnswered.empty() || !status.sourcesFailed.empty();
+}
+
 std::string statusJson(const DaemonStatus& status) {
     KSDictionary entries{{"Version", status.version},
                          {"DatabaseAvailable", status.databaseAvailable},
@@ -166,20 +222,21 @@ std::string statusJson(const DaemonStatus& status) {
                          {"BundleCount", status.bundleCount},
                          {"FilesIndexed", status.filesIndexed},
                          {"FilesRefused", status.filesRefused},
-                         {"Problems", KSArray(status.problems.begin(), status.problems.end())}};
+                         {"SourcesAnswered", arrayOf(status.sourcesAnswered)},
+                         {"SourcesFailed", arrayOf(status.sourcesFailed)},
+                         {"Problems", arrayOf(status.problems)}};
     if (status.lastCollection != 0) entries["LastCollection"] = KSDate{status.lastCollection};
     return jsonText(jsonForm(KSValue(entries))).value_or("{}") + "\n";
 }
 
 std::string statusText(const DaemonStatus& status, const Screen& screen) {
     const auto onOff = [](bool on) { return on ? "on" : "off"; };
-    const auto last = status.lastCollection == 0
-                          ? "never"
-                          : calendar::shortDateLongTime(KSDate{status.lastCollection});
+    const auto last = status.lastCollection == 0 ? "never" : shown(KSDate{status.lastCollection});
     std::string text = screen.bold("keepsakesd " + printable(status.version)) + "\n";
     text += fmt::format("  Database         {}\n",
                         status.databaseAvailable ? "available" : "not available");
     text += fmt::format("  Last collection  {}\n", last);
+    if (hasCollected(status)) text += fmt::format("  Sources          {}\n", sourcesText(status));
     text += fmt::format("  Activities       collection {}, compute {}, purge {}\n",
                         onOff(status.collectEnabled), onOff(status.computeEnabled),
                         onOff(status.purgeEnabled));
@@ -193,11 +250,14 @@ std::string statusText(const DaemonStatus& status, const Screen& screen) {
     return text;
 }
 
+std::string bundleTitle(const KSEventBundle& bundle) {
+    return printable(bundle.promptLanguage.value_or("(no prompt)"));
+}
+
 std::string bundleText(const KSEventBundle& bundle, const Screen& screen) {
-    const auto title = printable(bundle.promptLanguage.value_or("(no prompt)"));
     const auto start = bundle.startDate.value_or(bundle.creationDate());
     const auto end = bundle.endDate.value_or(start);
-    auto text = fmt::format("{}\n  {} to {}{}\n", screen.bold(title), shown(start),
+    auto text = fmt::format("{}\n  {} to {}{}\n", screen.bold(bundleTitle(bundle)), shown(start),
                             shownEnd(start, end), bundle.filtered ? ", by a rule" : "");
     return text + eventTable(bundle.events, screen, 2);
 }
@@ -250,8 +310,15 @@ int showBundles(const Console& console, const FetchWords& words) {
     if (!bundles) return console.fail(bundles.error());
     if (console.json()) return console.print(jsonRecords(*bundles));
     std::string text;
-    for (const auto& bundle : *bundles) text += bundleText(*bundle, console.screen()) + "\n";
-    return console.print(text + counted(bundles->size(), "bundle") + "\n");
+    std::size_t count = 0;
+    for (const auto& bundle : *bundles) {
+        // What happened since is told by another one.
+        if (bundle->events.empty()) continue;
+        ++count;
+        text += words.brief ? bundleTitle(*bundle) + "\n"
+                            : bundleText(*bundle, console.screen()) + "\n";
+    }
+    return console.print(text + counted(count, "bundle") + "\n");
 }
 
 int doWork(const Console& console, Work work) {
@@ -261,6 +328,23 @@ int doWork(const Console& console, Work work) {
     if (error) return console.fail(*error);
     console.endProgress();
     return console.print(console.json() ? "{\"done\":true}\n" : "done\n");
+}
+
+int collectEvents(const Console& console) {
+    const auto client = console.connect();
+    if (!client) return console.fail(client.error());
+    if (const auto error = (*client)->collectEvents()) return console.fail(*error);
+    console.endProgress();
+    const auto status = (*client)->status();
+    if (!status) return console.fail(status.error());
+    if (console.json()) {
+        const KSDictionary done{{"done", true},
+                                {"sourcesAnswered", arrayOf(status->sourcesAnswered)},
+                                {"sourcesFailed", arrayOf(status->sourcesFailed)}};
+        return console.print(jsonText(jsonForm(KSValue(done))).value_or("{}") + "\n");
+    }
+    return console.print(hasCollected(*status) ? fmt::format("done: {}\n", sourcesText(*status))
+                                               : "done\n");
 }
 
 int clearEvents(const Console& console, bool yes) {

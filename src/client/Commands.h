@@ -20,6 +20,7 @@ struct FetchWords {
     std::string category;
     std::optional<std::uint64_t> limit;
     bool filtered = false;
+    bool brief = false;  ///< Bundles without their events.
     bool descending = false;
 };
 int showEvents(const Console& console, const FetchWords& words);
@@ -31,6 +32,8 @@ int showTrends(const Console& console, const std::string& file, const std::strin
 /// One of the operations that take nothing and answer nothing.
 using Work = OptionalError (ConduitClient::*)();
 int doWork(const Console& console, Work work);
+/// Collects, and says which sources answered.
+int collectEvents(const Console& console);
 /// Asks on the terminal first, unless `yes`.
 int clearEvents(const Console& console, bool yes);
 

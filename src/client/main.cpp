@@ -68,6 +68,7 @@ class CommandLine {
             add(app_, "bundles", "Stored bundles with their events",
                 [this](const Console& console) { return showBundles(console, words_); });
         addWindow(bundles);
+        bundles->add_flag("--brief", words_.brief, "A line for each, without its events");
         bundles->add_flag("--filtered", words_.filtered, "Only bundles that a rule made");
         auto* trends =
             add(app_, "trends", "Yesterday beside four weeks of stored events, or of a file's",
@@ -81,7 +82,7 @@ class CommandLine {
         const auto work = [](Work operation) {
             return [operation](const Console& console) { return doWork(console, operation); };
         };
-        add(app_, "collect", "Collect new events now", work(&ConduitClient::collectEvents));
+        add(app_, "collect", "Collect new events now", collectEvents);
         add(app_, "bundle", "Bundle the events now", work(&ConduitClient::bundleEvents));
         add(app_, "analytics", "Run the analytics now", work(&ConduitClient::runAnalytics));
         add(app_, "purge", "Delete what has expired", work(&ConduitClient::purgeEvents));

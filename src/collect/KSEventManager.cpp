@@ -53,6 +53,11 @@ class Tally {
         return result;
     }
 
+    bool hasFailed(std::string_view successKey) const {
+        const std::lock_guard lock(mutex_);
+        return result_.contains(std::string(successKey));
+    }
+
     OptionalError lastError() const {
         const std::lock_guard lock(mutex_);
         return lastError_;
@@ -64,6 +69,15 @@ class Tally {
     std::int64_t total_ = 0;
     OptionalError lastError_;
 };
+
+/// "Workouts" of "resultWorkoutsSuccess".
+std::string sourceName(std::string_view successKey) {
+    constexpr std::string_view kBefore = "result";
+    constexpr std::string_view kAfter = "Success";
+    successKey.remove_prefix(kBefore.size());
+    successKey.remove_suffix(kAfter.size());
+    return std::string(successKey);
+}
 
 KSEventArray sortedAs(KSEventArray events, bool ascending) {
     std::ranges::stable_sort(events, [ascending](const auto& a, const auto& b) {
@@ -103,6 +117,11 @@ std::shared_ptr<KSEventManager> KSEventManager::initWithUniverse(const ServiceLo
 
 const std::shared_ptr<KSPersistenceManager>& KSEventManager::persistenceManager() const {
     return eventStore_->persistenceManager();
+}
+
+CollectionOutcome KSEventManager::lastOutcome() const {
+    const std::lock_guard lock(outcomeMutex_);
+    return outcome_;
 }
 
 void KSEventManager::setProgressObserver(ProgressObserver observer) {
@@ -147,6 +166,7 @@ void KSEventManager::collectEventsBetweenStartDate(KSDate start, KSDate end,
 void KSEventManager::_collectEventsBetweenStartDate(KSDate start, KSDate end,
                                                     const ResultHandler& handler) {
     const auto tally = std::make_shared<Tally>();
+    CollectionOutcome outcome;
     for (const auto& step : sources_->collectionSteps()) {
         Semaphore done;
         const auto finish = [tally, done, key = step.successKey](const OptionalError& error,
@@ -165,6 +185,12 @@ void KSEventManager::_collectEventsBetweenStartDate(KSDate start, KSDate end,
             logWarning(fmt::format("{}: {}", step.successKey, error.description()));
             tally->markFailed(step.successKey);
         }
+        (tally->hasFailed(step.successKey) ? outcome.failed : outcome.answered)
+            .push_back(sourceName(step.successKey));
+    }
+    {
+        const std::lock_guard lock(outcomeMutex_);
+        outcome_ = std::move(outcome);
     }
     handler(std::nullopt, tally->result());
 }

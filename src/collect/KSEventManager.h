@@ -4,7 +4,9 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <mutex>
 #include <string>
+#include <vector>
 
 #include "core/KSError.h"
 #include "core/ServiceLookup.h"
@@ -20,6 +22,13 @@ class KSDiscoveryManager;
 class KSEventStore;
 class KSPersistenceManager;
 struct PlatformServices;
+
+/// Which sources a collection could read, by the names in the keys of its result: "Workouts" of
+/// "resultWorkoutsSuccess". In the order of collection.
+struct CollectionOutcome {
+    std::vector<std::string> answered;
+    std::vector<std::string> failed;
+};
 
 /// The collection pipeline: asks each source in turn to fetch and save a window's events, cleans
 /// the store, and answers fetches with what the database does not keep filled in again from the
@@ -67,6 +76,9 @@ class KSEventManager final : public KSService {
 
     const std::shared_ptr<KSPersistenceManager>& persistenceManager() const;
 
+    /// Of the last collection that ended; empty before.
+    CollectionOutcome lastOutcome() const;
+
   private:
     KSEventManager(const PlatformServices& platform,
                    std::shared_ptr<KSDefaultsManager> defaultsManager,
@@ -88,6 +100,8 @@ class KSEventManager final : public KSService {
     const std::unique_ptr<EventSources> sources_;
     const std::shared_ptr<KSDiscoveryManager> discoveryManager_;  ///< Where devices are counted.
     ProgressObserver progressObserver_;                           // only on refreshQueue_
+    mutable std::mutex outcomeMutex_;
+    CollectionOutcome outcome_;  // guarded by outcomeMutex_
     WorkQueue queue_;
     WorkQueue refreshQueue_;  // waits for the scan of the owner's files
     WorkQueue metricsQueue_;  // waits for the owner's age and sex

@@ -66,6 +66,12 @@ int hours(KSDate date) { return field(date, UCAL_HOUR_OF_DAY); }
 int minutes(KSDate date) { return field(date, UCAL_MINUTE); }
 int weekday(KSDate date) { return field(date, UCAL_DAY_OF_WEEK); }
 
+bool isWholeDays(KSDateInterval span) {
+    const auto isMidnight = [](KSDate date) { return startOfDay(date) == date; };
+    return span.end > span.start && isMidnight(span.start) &&
+           (isMidnight(span.end) || isMidnight(span.end + 1));
+}
+
 int yearsBetween(KSDate from, KSDate to) {
     if (!std::isfinite(from.seconds) || !std::isfinite(to.seconds)) return 0;
     UErrorCode status = U_ZERO_ERROR;

@@ -21,6 +21,9 @@ int minutes(KSDate date);
 /// 1 Sunday to 7 Saturday.
 int weekday(KSDate date);
 
+/// Whether it reaches from a midnight to another, or to the last second before that.
+bool isWholeDays(KSDateInterval span);
+
 /// Whole years from `from` to `to`, as birthdays are counted.
 int yearsBetween(KSDate from, KSDate to);
 

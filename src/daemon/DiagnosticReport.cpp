@@ -12,6 +12,7 @@
 #include <optional>
 #include <utility>
 
+#include "collect/KSEventManager.h"
 #include "core/Clock.h"
 #include "core/Log.h"
 #include "daemon/KSDaemonUniverse.h"
@@ -20,7 +21,6 @@
 #include "platform/PowerSources.h"
 #include "platform/SystemNotifications.h"
 #include "service/StatusReporter.h"
-#include "store/KSPersistenceManager.h"
 
 namespace keepsakes {
 
@@ -139,7 +139,7 @@ std::vector<std::string> DiagnosticReport::countLines() const {
     const auto reply = std::make_shared<Reply>();
     Semaphore answered;
     StatusReporter reporter(universe_.platform(),
-                            universe_.service<KSPersistenceManager>("PersistenceManager"));
+                            universe_.service<KSEventManager>("EventManager"));
     reporter.status([reply, answered](DaemonStatus status) mutable {
         {
             const std::lock_guard lock(reply->mutex);
@@ -156,6 +156,8 @@ std::vector<std::string> DiagnosticReport::countLines() const {
                     status.lastCollection == 0 ? "never" : formatISO8601({status.lastCollection})),
         fmt::format("events {}, bundles {}", status.eventCount, status.bundleCount),
         fmt::format("files indexed {}, refused {}", status.filesIndexed, status.filesRefused),
+        fmt::format("sources answered {}, failed {}", status.sourcesAnswered.size(),
+                    status.sourcesFailed.size()),
         fmt::format("problems {}", status.problems.size()),
     };
     for (const auto& problem : status.problems) lines.push_back("  " + problem);

@@ -28,8 +28,7 @@ std::string_view suggestionWord(std::uint64_t suggestedEventCategory) {
         case KSSuggestedEventCategoryLodging:
             return "stay";
         case KSSuggestedEventCategorySocial:
-        case KSSuggestedEventCategoryNLEvent:
-            return "with others";
+            return "occasion";
         default:
             return {};
     }

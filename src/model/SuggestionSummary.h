@@ -8,7 +8,8 @@
 
 namespace keepsakes {
 
-/// What people call a suggested event's category: "flight", "car rental"; empty for none.
+/// What people call a suggested event's category: "flight", "car rental"; empty for none, and
+/// for what a social event is anyway.
 std::string_view suggestionWord(std::uint64_t suggestedEventCategory);
 
 /// Where the event's calendar entry is held, or nothing.

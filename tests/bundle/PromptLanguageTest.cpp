@@ -55,7 +55,12 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
     const auto link = makeEvent(1, start.seconds, start.seconds, KSEventProvider::foresight,
                                 KSEventCategory::linkshelf);
     link->itemURL = "https://www.example.org/tours/?id=1";
-    EXPECT_EQ(prompt("", {link}), "Links shared with you: \"example.org/tours\", Saturday 10:02");
+    EXPECT_EQ(prompt("", {link}), "A link shared with you: \"example.org/tours\", Saturday 10:02");
+    EXPECT_EQ(prompt("", {link, link}),
+              "Links shared with you: \"example.org/tours\", Saturday 10:02");
+    link->itemIsShared = true;
+    EXPECT_EQ(prompt("", {link}), "A link you shared: \"example.org/tours\", Saturday 10:02");
+    link->itemIsShared = false;
     link->itemLinkTitle = "Tours";
     link->itemDisplayName = "Anna";
     EXPECT_EQ(prompt("", {link, hike}),
@@ -90,6 +95,11 @@ TEST(PromptLanguage, SaysWhatABundleHolds) {
     const auto table = makeEvent(2, start.seconds, end.seconds, KSEventProvider::foresight,
                                  KSEventCategory::structuredEvent);
     table->suggestedEventTitle = "Tisch";
+    const auto trip = makeEvent(3, saturday.seconds, (saturday + 2 * 86400).seconds,
+                                KSEventProvider::foresight, KSEventCategory::travel);
+    trip->tripTitle = "Lisbon";
+    EXPECT_EQ(prompt("TravelEvent", {trip}), "A trip: Lisbon, Saturday to Sunday");
+    EXPECT_EQ(prompt("", {trip, far}), "On a trip: Lisbon, Lake, Saturday to Sunday");
     EXPECT_EQ(prompt("", {party, table}),
               "Planned: Annas Geburtstag, Tisch, Saturday 10:02 to 12:31");
     const auto song = makeEvent(1, start.seconds, end.seconds, KSEventProvider::foresight,

@@ -73,7 +73,8 @@ TEST_F(KeepsakesctlTest, ExitStatusesAndTexts) {
     } rows[] = {
         {"status", 0, "Last collection"},
         {"status", 0, "a\uFFFD[2Jb.gpx"},
-        {"collect", 0, "done"},
+        {"collect", 0, "done: 2 sources answered, but not Topics, Trips\n"},
+        {"collect --json", 0, R"("sourcesFailed":["Topics","Trips"])"},
         {"purge --json", 0, "{\"done\":true}"},
         {"clear --yes", 0, "done"},
         {"clear </dev/null", 2, "--yes"},
@@ -101,8 +102,8 @@ TEST_F(KeepsakesctlTest, ExitStatusesAndTexts) {
         EXPECT_EQ(result.status, row.status) << arguments << "\n" << result.output;
         EXPECT_THAT(result.output, HasSubstr(row.text)) << arguments;
     }
-    EXPECT_THAT(conduit_.calls(),
-                ElementsAre("collectEvents", "purgeEvents", "clearEvents", "fetchEvents"));
+    EXPECT_THAT(conduit_.calls(), ElementsAre("collectEvents", "collectEvents", "purgeEvents",
+                                              "clearEvents", "fetchEvents"));
 
     conduit_.failWith(KSError::make(KSErrorCode::databaseUnavailable, "no database"));
     for (const char* command : {"bundle", "analytics", "events", "bundles --json", "export"}) {
@@ -163,6 +164,27 @@ TEST_F(KeepsakesctlTest, TopicsAreShownByTheirNamesTheStrongestFirst) {
     EXPECT_THAT(run("events").output, HasSubstr("Tother 1.00, Hiking 0.82, Food 0.55\n"));
 }
 
+TEST_F(KeepsakesctlTest, PhotosTellWhatTheyShowAndWhom) {
+    const auto detailsOf = [this](std::vector<std::string> words,
+                                  const std::vector<std::string>& people) {
+        auto attributes = KSEventExtendedAttributes::initWithLocalIdentifier("k");
+        attributes->photoKeepsakeInferences = std::move(words);
+        attributes->photoKeepsakePersons.emplace();
+        for (const auto& name : people) {
+            attributes->photoKeepsakePersons->push_back({{}, name, {}, {}});
+        }
+        const KSDate day = *calendar::dateOfDay(2024, 6, 15);
+        const auto photos = makePhotos(1, day.seconds, (day + 86400).seconds, {});
+        photos->extendedAttributes = std::move(attributes);
+        conduit_.setEvents({photos});
+        return run("events").output;
+    };
+    EXPECT_THAT(detailsOf({"beach", "beaching", "amusementpark"}, {"Anna", "Ben"}),
+                HasSubstr("\n2024-06-15  all day  Photo Keepsake  Photo     "
+                          "beach, amusement park; with Anna, Ben\n"));
+    EXPECT_THAT(detailsOf({}, {"Anna"}), HasSubstr(" Photo     with Anna\n"));
+}
+
 TEST_F(KeepsakesctlTest, TheJsonFormIsStableAndGoesBackIn) {
     conduit_.setEvents({samples::fullEvent(1), samples::event(2)});
     const auto json = run("events --json");
@@ -218,6 +240,9 @@ TEST_F(KeepsakesctlTest, TablesShowLocalTimesAndBundlesTheirEvents) {
     const auto bundles = run("bundles").output;
     EXPECT_THAT(bundles, HasSubstr("A hike with photos\n  2023-03-08 22:26 to 22:56, by a rule\n"
                                    "  Start"));
+    EXPECT_EQ(run("bundles --brief").output, "A hike with photos\n1 bundle\n");
+    conduit_.setBundles({samples::bundle({})});
+    EXPECT_EQ(run("bundles").output, "0 bundles\n") << "its events are gone";
 }
 
 /// Answers as the daemon does that counts days from `now`.

@@ -104,6 +104,8 @@ TEST_F(Manager, ASilentSourceCostsTwoMinutesAndOnlyItself) {
     EXPECT_EQ(outcome->error, "");
     EXPECT_EQ(outcome->result, R"({"resultNumberOfEvents": 1, "resultWorkoutsSuccess": false, )"
                                R"("stateDatabaseAvailable": true})");
+    EXPECT_THAT(events->lastOutcome().answered, ElementsAre("Photos", "Topics", "Music"));
+    EXPECT_THAT(events->lastOutcome().failed, ElementsAre("Workouts"));
 }
 
 TEST_F(Manager, FetchesInTheOrderAskedForWithDetailsFilledInAgain) {

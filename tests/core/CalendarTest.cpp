@@ -108,6 +108,24 @@ TEST_F(CalendarTest, LocalTimesThatComeTwiceOrNeverHaveOneInstant) {
     EXPECT_EQ(calendar::offsetAt(at("2024-03-31T01:00:00Z")), 7200);
 }
 
+TEST_F(CalendarTest, WholeDaysReachFromMidnightToMidnight) {
+    const struct {
+        const char* start;
+        const char* end;
+        bool whole;
+    } cases[] = {
+        {"2024-06-15T00:00:00+02:00", "2024-06-16T00:00:00+02:00", true},
+        {"2024-06-15T00:00:00+02:00", "2024-06-15T23:59:59+02:00", true},
+        {"2024-03-31T00:00:00+01:00", "2024-04-01T00:00:00+02:00", true},
+        {"2024-06-15T00:00:00+02:00", "2024-06-15T23:59:00+02:00", false},
+        {"2024-06-15T02:00:00+02:00", "2024-06-16T02:00:00+02:00", false},
+        {"2024-06-15T00:00:00+02:00", "2024-06-15T00:00:00+02:00", false},
+    };
+    for (const auto& [start, end, whole] : cases) {
+        EXPECT_EQ(calendar::isWholeDays({at(start), at(end)}), whole) << start << ' ' << end;
+    }
+}
+
 TEST_F(CalendarTest, DaysByNumberExistAsTheCalendarSays) {
     struct Case {
         const char* zone;
