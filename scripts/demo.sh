@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
 # Shows the daemon at work: collects, bundles and prints what it would suggest.
-#   scripts/demo.sh                 the sample recordings of data/sample, a weekend of June 2024
+#   scripts/demo.sh                 the sample owner's month, May and June 2024, week by week
 #   scripts/demo.sh FOLDER...       your own recordings, at the end of the last week they hold
 # Nothing of yours is changed: the daemon runs on a message bus of its own and keeps its database in
 # a temporary folder that is removed at the end. Folders given are only read.
@@ -31,13 +31,16 @@ toml_strings() {
     done
 }
 
-# newest_record INDEX: the end of the newest workout, photo occasion, visit, message or call, in
-# seconds since 2001.
+# newest_record INDEX: the end of the newest workout, photo occasion, visit, message, call or
+# suggested calendar entry, in seconds since 2001. Calendars know the future, which is left out.
 newest_record() {
     sqlite3 -readonly "$1" "SELECT max(moment) FROM (SELECT max(end) AS moment FROM workouts
                             UNION ALL SELECT max(end) FROM occasions
                             UNION ALL SELECT max(end) FROM visits WHERE place IS NOT NULL
-                            UNION ALL SELECT max(end) FROM interactions)"
+                            UNION ALL SELECT max(end) FROM interactions
+                            UNION ALL SELECT max(end) FROM calendarEvents
+                                      WHERE category IS NOT NULL
+                                        AND end <= strftime('%s', 'now') - 978307200)"
 }
 
 # records_by_week INDEX: "2024, week 24: 5 2 12" for the eight newest weeks with records.
@@ -76,7 +79,11 @@ if [ "$stage" = start ]; then
         contacts=("$PWD/data/sample/contacts")
         calendars=("$PWD/data/sample/calendars")
         export TZ=Europe/Vienna
-        now=2024-06-16T20:00:00+02:00
+        chats=("+43 664 555 00 77")  # Tom's: all links in it count
+        # Visits are kept for seven days from when they were found: the ten minutes more each week make
+        # sure that those of the week before are purged.
+        evenings=(2024-05-26T19:30:00+02:00 2024-06-02T19:40:00+02:00 2024-06-09T19:50:00+02:00
+            2024-06-16T20:00:00+02:00)
     else
         tracks=("${folders[@]}")
         photos=("${folders[@]}")
@@ -84,14 +91,15 @@ if [ "$stage" = start ]; then
         messages=("${folders[@]}")
         contacts=("${folders[@]}")
         calendars=("${folders[@]}")
+        chats=()
         echo "reading ${folders[*]}"
         "$bin/keepsakes-indexer" --index "$home/look.sqlite" --tracks "${tracks[@]}" \
             --photos "${photos[@]}" --messages "${messages[@]}" \
             --contacts "${contacts[@]}" --calendars "${calendars[@]}" --human
         newest=$(newest_record "$home/look.sqlite")
         if [ -z "$newest" ]; then
-            echo "There is no workout, photo occasion, visit or message in these folders, so there is" \
-                 "nothing to suggest. The lines above say which files were passed over and why."
+            echo "There is no workout, photo occasion, visit, message or suggested calendar entry in" \
+                 "these folders, so there is nothing to suggest. The lines above say which files were passed over and why."
             exit 1
         fi
         echo
@@ -100,7 +108,7 @@ if [ "$stage" = start ]; then
         # Midnight after the Sunday that ends the week of the newest record.
         unix=$((${newest%.*} + 978307200))
         weekday=$(date -d "@$unix" +%u)
-        now=$(date -d "$(date -d "@$unix" +%F) + $((8 - weekday)) days" +%FT%T%:z)
+        evenings=("$(date -d "$(date -d "@$unix" +%F) + $((8 - weekday)) days" +%FT%T%:z)")
     fi
 
     # Assigned first: a failure inside the text below would go unnoticed.
@@ -110,6 +118,7 @@ if [ "$stage" = start ]; then
     message_folders=$(toml_strings "${messages[@]}")
     contact_folders=$(toml_strings "${contacts[@]}")
     calendar_folders=$(toml_strings "${calendars[@]}")
+    chat_names=$(toml_strings ${chats[@]+"${chats[@]}"})
     mkdir -p "$XDG_CONFIG_HOME/keepsakesd"
     cat >"$XDG_CONFIG_HOME/keepsakesd/config.toml" <<EOF
 [device_data]
@@ -120,26 +129,26 @@ messages  = [$message_folders]
 contacts  = [$contact_folders]
 places    = [$place_folders]
 media     = false           # no player is on this bus
+[links]
+chats     = [$chat_names]
 [activities]                # nothing runs but what this script asks for
 collection = "0"
 compute    = "0"
 purge      = "0"
 EOF
+    of=sample
+    if [ "$#" -gt 0 ]; then of=yours; fi
     status=0
-    dbus-run-session -- "$0" --inside-bus "$now" ${folders[@]+"${folders[@]}"} || status=$?
+    dbus-run-session -- "$0" --inside-bus "$of" "${evenings[@]}" || status=$?
     exit "$status"
 fi
 
 # From here on: inside the private bus.
-now=$1
+of=$1
 shift
 log=$HOME/daemon.log
-"$bin/keepsakesd" --config "$XDG_CONFIG_HOME/keepsakesd/config.toml" --now "$now" 2>"$log" &
-daemon=$!
-stop() {
-    kill -TERM "$daemon" 2>/dev/null || true
-    wait "$daemon" || { echo "the daemon did not end in order:" >&2; cat "$log" >&2; return 1; }
-}
+ctl=$bin/keepsakesctl
+
 fail() {
     echo "$1" >&2
     cat "$log" >&2
@@ -147,54 +156,97 @@ fail() {
     wait "$daemon" 2>/dev/null || true
     exit 1
 }
-
-for ((attempt = 0; ; ++attempt)); do
-    "$bin/keepsakesctl" status >/dev/null 2>&1 && break
-    kill -0 "$daemon" 2>/dev/null || fail "the daemon did not start:"
-    [ "$attempt" -lt 100 ] || fail "the daemon did not answer within 10 seconds:"
-    sleep 0.1
-done
-
-# A demonstration cannot listen to players for days: the sample's plays are put where the daemon
-# would have written them.
-if [ "$#" -eq 0 ]; then
-    sqlite3 -bail "$XDG_CACHE_HOME/com.brindle.keepsakesd/mediaStream.sqlite" \
-        '.import --csv data/sample/media/plays.csv sample' \
-        "INSERT INTO records(timestamp, state, duration, title, album, artist, genre, bundleID)
-         SELECT timestamp, state, duration, title, nullif(album, ''), artist, genre, bundleID
-         FROM sample" \
-        'DROP TABLE sample' || fail "the sample's plays could not be put in place:"
-    echo "What was played that week was not heard: it is taken from data/sample/media/plays.csv."
-fi
-
+start_daemon() {
+    "$bin/keepsakesd" --config "$XDG_CONFIG_HOME/keepsakesd/config.toml" --now "$1" 2>>"$log" &
+    daemon=$!
+    local attempt
+    for ((attempt = 0; ; ++attempt)); do
+        "$ctl" status >/dev/null 2>&1 && break
+        kill -0 "$daemon" 2>/dev/null || fail "the daemon did not start:"
+        [ "$attempt" -lt 100 ] || fail "the daemon did not answer within 10 seconds:"
+        sleep 0.1
+    done
+}
+stop() {
+    kill -TERM "$daemon" 2>/dev/null || true
+    wait "$daemon" || { echo "the daemon did not end in order:" >&2; cat "$log" >&2; return 1; }
+}
 step() {
     echo
     echo "\$ keepsakesctl $*"
-    "$bin/keepsakesctl" "$@" || fail "keepsakesctl $* failed with status $?; the daemon's log:"
+    "$ctl" "$@" || fail "keepsakesctl $* failed with status $?; the daemon's log:"
+}
+count() { "$ctl" "$1" --json | python3 -c 'import json, sys; print(len(json.load(sys.stdin)))'; }
+
+# collect_and_bundle NOW: the week before.
+collect_and_bundle() {
+    "$ctl" defaults write com.brindle.keepsakesd EventManagerEventCollectionStartDate \
+        "$(date -d "$1 - 7 days" +%FT%T%:z)"
+    step collect
+    step bundle
 }
 
-echo "It is $now for the daemon, which looks back a week."
-"$bin/keepsakesctl" defaults write com.brindle.keepsakesd EventManagerEventCollectionStartDate \
-    "$(date -d "$now - 7 days" +%FT%T%:z)"
-"$bin/keepsakesctl" defaults write com.brindle.Sharelane LinkshelfEnabled true
-step collect
-step bundle
-step events
-step bundles
-step status
+# put_plays NOW: a demonstration cannot listen to players for days; what was played until then is put
+# where the daemon would have written it.
+put_plays() {
+    sqlite3 -bail "$XDG_CACHE_HOME/com.brindle.keepsakesd/mediaStream.sqlite" \
+        '.import --csv data/sample/media/plays.csv sample' \
+        "INSERT INTO records(timestamp, state, duration, title, album, artist, genre, bundleID)
+         SELECT timestamp, state, duration, title, nullif(album, ''), nullif(artist, ''), genre,
+                bundleID
+         FROM sample
+         WHERE CAST(timestamp AS REAL) <= $(date -d "$1" +%s) - 978307200
+           AND CAST(timestamp AS REAL) > (SELECT coalesce(max(timestamp), 0) FROM records)" \
+        'DROP TABLE sample' || fail "the sample's plays could not be put in place:"
+}
 
-count() { "$bin/keepsakesctl" "$1" --json | python3 -c 'import json, sys; print(len(json.load(sys.stdin)))'; }
-events=$(count events)
-bundles=$(count bundles)
-stop || exit 1
+"$ctl" defaults write com.brindle.Sharelane LinkshelfEnabled true
 
-echo
-echo "In that week: events: $events, bundles: $bundles."
-if [ "$#" -gt 0 ]; then
+if [ "$of" = yours ]; then
+    now=$1
+    start_daemon "$now"
+    echo "It is $now for the daemon, which looks back a week."
+    collect_and_bundle "$now"
+    step events
+    step bundles
+    step status
+    events=$(count events)
+    bundles=$(count bundles)
+    stop || exit 1
     cat <<EOF
+
+In that week: events: $events, bundles: $bundles.
 Why not more: this run looks at the week before $now only (all weeks stand above);
 files that cannot be read, or that carry no time, are passed over (status names them above);
 a bundle needs events that overlap in time, such as photos taken during a recorded walk.
 EOF
+    [ "$events" -gt 0 ]
+    exit
 fi
+
+cat <<EOF
+The sample owner's month, as keepsakesd sees it at the end of each week. The files of the whole month
+lie there from the start. What was played was not heard: it is taken from data/sample/media/plays.csv.
+EOF
+week=0
+for now in "$@"; do
+    week=$((week + 1))
+    monday=$(date -d "$now - 6 days" +%F)
+    sunday=$(date -d "$now" +%F)
+    start_daemon "$now"
+    put_plays "$now"
+    echo
+    echo "==== Week $week: for the daemon it is Sunday, $sunday, $(date -d "$now" +%H:%M) ===="
+    collect_and_bundle "$now"
+    if [ "$week" -gt 1 ]; then step purge; fi
+    step events --since "$monday" --until "$sunday"
+    step bundles --since "$monday" --until "$sunday" --filtered --brief
+    if [ "$week" -lt "$#" ]; then stop || exit 1; fi
+done
+echo
+echo "==== The last day beside the four weeks before ===="
+step trends --now "$now"
+step status
+events=$(count events)
+stop || exit 1
 [ "$events" -gt 0 ]
