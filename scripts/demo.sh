@@ -32,24 +32,29 @@ toml_strings() {
 }
 
 # newest_record INDEX: the end of the newest workout, photo occasion, visit, message, call or
-# suggested calendar entry, in seconds since 2001. Calendars know the future, which is left out.
+# suggested calendar entry, in seconds since 2001. Calendars know the future, which is left out, and
+# birthdays come every year: what recurs counts where there is nothing else.
 newest_record() {
-    sqlite3 -readonly "$1" "SELECT max(moment) FROM (SELECT max(end) AS moment FROM workouts
+    local suggested="SELECT max(end) FROM calendarEvents WHERE category IS NOT NULL
+                     AND end <= strftime('%s', 'now') - 978307200"
+    sqlite3 -readonly "$1" "SELECT coalesce(max(moment), ($suggested))
+                            FROM (SELECT max(end) AS moment FROM workouts
                             UNION ALL SELECT max(end) FROM occasions
                             UNION ALL SELECT max(end) FROM visits WHERE place IS NOT NULL
                             UNION ALL SELECT max(end) FROM interactions
-                            UNION ALL SELECT max(end) FROM calendarEvents
-                                      WHERE category IS NOT NULL
-                                        AND end <= strftime('%s', 'now') - 978307200)"
+                            UNION ALL $suggested AND NOT recurs)"
 }
 
-# records_by_week INDEX: "2024, week 24: 5 2 12" for the eight newest weeks with records.
+# records_by_week INDEX: "2024, week 24: 5 2 12 1" for the eight newest weeks with records.
 records_by_week() {
     sqlite3 -readonly "$1" "
         SELECT strftime('  %Y, week %W: ', end + 978307200, 'unixepoch', 'localtime')
-               || sum(kind = 1) || ' ' || sum(kind = 2) || ' ' || sum(kind = 3)
+               || sum(kind = 1) || ' ' || sum(kind = 2) || ' ' || sum(kind = 3) || ' '
+               || sum(kind = 4)
         FROM (SELECT end, 1 AS kind FROM workouts UNION ALL SELECT end, 2 FROM occasions
-              UNION ALL SELECT end, 3 FROM visits WHERE place IS NOT NULL)
+              UNION ALL SELECT end, 3 FROM visits WHERE place IS NOT NULL
+              UNION ALL SELECT end, 4 FROM calendarEvents WHERE category IS NOT NULL AND NOT recurs
+                            AND end <= strftime('%s', 'now') - 978307200)
         GROUP BY strftime('%Y %W', end + 978307200, 'unixepoch', 'localtime')
         ORDER BY max(end) DESC LIMIT 8"
 }
@@ -103,7 +108,7 @@ if [ "$stage" = start ]; then
             exit 1
         fi
         echo
-        echo "By week, the newest first (workouts, photo occasions, visits):"
+        echo "By week, the newest first (workouts, photo occasions, visits, suggested entries):"
         records_by_week "$home/look.sqlite"
         # Midnight after the Sunday that ends the week of the newest record.
         unix=$((${newest%.*} + 978307200))
@@ -245,6 +250,7 @@ for now in "$@"; do
 done
 echo
 echo "==== The last day beside the four weeks before ===="
+echo "Visits are kept for a week, so that of work there are the days of this week."
 step trends --now "$now"
 step status
 events=$(count events)

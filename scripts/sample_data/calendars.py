@@ -54,7 +54,7 @@ def make_calendar(folder):
         "zug-zurueck": vevent("zug-zurueck", "Zug von Wien nach Graz", "20240611T175800",
                               "20240611T203300", "DESCRIPTION:RJ 559"),
         "geburtstag": vevent("geburtstag", "Geburtstagsfeier bei Anna", "20240614T193000",
-                             "20240614T233000", "LOCATION:Bei Anna"),
+                             "20240614T233000", "LOCATION:Im Hof"),
         "kino": vevent("kino", "Kino: Der lange Sommer", "20240613T201500", "20240613T223000",
                        "LOCATION:Filmzentrum\\, Graz"),
         "besprechung": vevent("besprechung", "Teambesprechung", "20240603T090000",

@@ -27,6 +27,7 @@ namespace {
 
 constexpr std::string_view kMinutePattern = "yyyy-MM-dd HH:mm";
 constexpr std::string_view kDayPattern = "yyyy-MM-dd";
+constexpr std::string_view kAllDay = "all day";
 
 std::string counted(std::size_t count, std::string_view what) {
     return fmt::format("{} {}{}", count, what, count == 1 ? "" : "s");
@@ -45,14 +46,23 @@ std::string shownStart(KSDate start, KSDate end) {
                                                : shown(start);
 }
 
-/// The end without its day when that is the start's.
+/// The end without its day when that is the start's; nothing for a moment.
 std::string shownEnd(KSDate start, KSDate end) {
+    if (end == start) return {};
     if (calendar::isWholeDays({start, end})) {
         const auto last = calendar::startOfDay(end - 1);
-        return last > start ? calendar::format(last, kDayPattern) : "all day";
+        return last > start ? calendar::format(last, kDayPattern) : std::string(kAllDay);
     }
     const bool sameDay = calendar::startOfDay(start) == calendar::startOfDay(end);
     return sameDay ? calendar::format(end, "HH:mm") : shown(end);
+}
+
+/// "2024-06-15 10:02 to 12:31", "2024-06-15, all day", "2024-06-15 10:02".
+std::string shownSpan(KSDate start, KSDate end) {
+    const auto from = shownStart(start, end);
+    const auto to = shownEnd(start, end);
+    if (to.empty()) return from;
+    return to == kAllDay ? fmt::format("{}, {}", from, to) : fmt::format("{} to {}", from, to);
 }
 
 /// Where a visit was, what the place is to the owner, and how far from home it is.
@@ -257,8 +267,8 @@ std::string bundleTitle(const KSEventBundle& bundle) {
 std::string bundleText(const KSEventBundle& bundle, const Screen& screen) {
     const auto start = bundle.startDate.value_or(bundle.creationDate());
     const auto end = bundle.endDate.value_or(start);
-    auto text = fmt::format("{}\n  {} to {}{}\n", screen.bold(bundleTitle(bundle)), shown(start),
-                            shownEnd(start, end), bundle.filtered ? ", by a rule" : "");
+    auto text = fmt::format("{}\n  {}{}\n", screen.bold(bundleTitle(bundle)), shownSpan(start, end),
+                            bundle.filtered ? ", by a rule" : "");
     return text + eventTable(bundle.events, screen, 2);
 }
 
