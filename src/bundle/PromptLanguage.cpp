@@ -10,13 +10,11 @@
 #include <vector>
 
 #include "core/Calendar.h"
-#include "core/Text.h"
 #include "model/ContactSummary.h"
 #include "model/KSEventBundle.h"
 #include "model/LinkSummary.h"
 #include "model/TopicNames.h"
 #include "trends/TrendWords.h"
-#include "trends/TrendsKeys.h"
 
 namespace keepsakes {
 
@@ -223,15 +221,6 @@ bool isTrend(const KSEventPointer& event) {
     return event->provider() == KSEventProvider::postAnalytics;
 }
 
-std::string trendText(const KSDictionary& trends) {
-    const auto* keyword = valueForKey(trends, trendskey::kKeyword).asString();
-    const auto& wording = trendWordingOf(keyword ? *keyword : std::string());
-    const auto code = valueForKey(trends, trendskey::kTrends).asInteger();
-    const auto verdict =
-        code ? static_cast<KSTrendsVerdict>(*code) : KSTrendsVerdict::notEnoughData;
-    return fmt::format("{}, {}", lowerCased(wording.title), wordsOf(wording, verdict));
-}
-
 bool isSocial(const KSEventPointer& event) {
     return event->category() == KSEventCategory::socialEvent ||
            event->suggestedEventCategory == KSSuggestedEventCategorySocial;
@@ -279,7 +268,7 @@ void addDistinct(std::vector<std::string>& texts, const std::optional<std::strin
 std::vector<std::string> titles(const KSEventBundle& bundle) {
     std::vector<std::string> texts;
     for (const auto& event : bundle.events) {
-        if (isTrend(event) && event->trends) addDistinct(texts, trendText(*event->trends));
+        if (isTrend(event) && event->trends) addDistinct(texts, trendTextOf(*event->trends));
         if (event->scoredTopics) {
             for (const auto& [name, score] : topicsByScore(*event->scoredTopics)) {
                 addDistinct(texts, name);

@@ -20,6 +20,7 @@
 #include "model/LinkSummary.h"
 #include "model/SuggestionSummary.h"
 #include "model/TopicNames.h"
+#include "trends/TrendWords.h"
 
 namespace keepsakes {
 
@@ -142,6 +143,10 @@ std::string photosText(const KSEventExtendedAttributes& photos) {
 
 /// What tells one event from another of its kind.
 std::string detailsOf(const KSEvent& event) {
+    // It has the category of what it tells of, and nothing else of that.
+    if (event.provider() == KSEventProvider::postAnalytics && event.trends) {
+        return trendTextOf(*event.trends);
+    }
     std::string details;
     const auto add = [&details](const std::optional<std::string>& part) {
         if (!part || part->empty()) return;

@@ -11,9 +11,8 @@ namespace keepsakes {
 class KSEventManager;
 struct PlatformServices;
 
-/// Gathers the daemon's status: counts from the database, the last
-/// scan and collection, the problems. Owned by
-/// the server; any thread may ask and never waits.
+/// Gathers the daemon's status: counts from the database, the last scan and collection, the
+/// problems. Owned by the server; any thread may ask and never waits.
 class StatusReporter final : public StatusSource {
   public:
     StatusReporter(const PlatformServices& platform, std::shared_ptr<KSEventManager> eventManager);

@@ -1,8 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "trends/TrendWords.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <array>
+
+#include "core/Text.h"
+#include "trends/TrendsKeys.h"
 
 namespace keepsakes {
 
@@ -46,6 +51,15 @@ std::string_view wordsOf(const TrendWording& wording, KSTrendsVerdict verdict) {
             break;
     }
     return "not enough data";
+}
+
+std::string trendTextOf(const KSDictionary& trends) {
+    const auto* keyword = valueForKey(trends, trendskey::kKeyword).asString();
+    const auto& wording = trendWordingOf(keyword ? *keyword : std::string());
+    const auto code = valueForKey(trends, trendskey::kTrends).asInteger();
+    const auto verdict =
+        code ? static_cast<KSTrendsVerdict>(*code) : KSTrendsVerdict::notEnoughData;
+    return fmt::format("{}, {}", lowerCased(wording.title), wordsOf(wording, verdict));
 }
 
 }  // namespace keepsakes

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <string>
 #include <string_view>
 
+#include "core/KSValue.h"
 #include "trends/TrendFindings.h"
 
 namespace keepsakes {
@@ -24,5 +26,8 @@ const TrendWording& trendWordingOf(std::string_view keyword);
 
 /// "more workout time than usual"; "nothing unusual" and the like where it is not.
 std::string_view wordsOf(const TrendWording& wording, KSTrendsVerdict verdict);
+
+/// What a trends event found: "workouts, more workout time than usual".
+std::string trendTextOf(const KSDictionary& trends);
 
 }  // namespace keepsakes

@@ -164,6 +164,15 @@ TEST_F(KeepsakesctlTest, TopicsAreShownByTheirNamesTheStrongestFirst) {
     EXPECT_THAT(run("events").output, HasSubstr("Tother 1.00, Hiking 0.82, Food 0.55\n"));
 }
 
+TEST_F(KeepsakesctlTest, TrendsAmongTheEventsSayWhatTheyFound) {
+    const auto trend =
+        makeEvent(1, 100, 200, KSEventProvider::postAnalytics, KSEventCategory::visit);
+    trend->trends = KSDictionary{{"keyword", "work.exit"}, {"trends", 6}};
+    conduit_.setEvents({trend});
+    EXPECT_THAT(run("events").output,
+                HasSubstr("Post Analytics  leaving work, left work later than usual\n"));
+}
+
 TEST_F(KeepsakesctlTest, PhotosTellWhatTheyShowAndWhom) {
     const auto detailsOf = [this](std::vector<std::string> words,
                                   const std::vector<std::string>& people) {
