@@ -188,6 +188,7 @@ collect_and_bundle() {
     "$ctl" defaults write com.brindle.keepsakesd EventManagerEventCollectionStartDate \
         "$(date -d "$1 - 7 days" +%FT%T%:z)"
     step collect
+    sed -n 's/.*: \(collected, .*\)/\1/p' "$log" | tail -n 1
     step bundle
 }
 

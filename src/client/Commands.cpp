@@ -211,21 +211,6 @@ std::optional<std::string> readWords(const FetchWords& words, Options& options) 
     return std::nullopt;
 }
 
-KSArray arrayOf(const std::vector<std::string>& texts) { return {texts.begin(), texts.end()}; }
-
-/// "9 sources answered", "8 sources answered, but not Topics".
-std::string sourcesText(const DaemonStatus& status) {
-    auto text = fmt::format("{} answered", counted(status.sourcesAnswered.size(), "source"));
-    for (const auto& name : status.sourcesFailed) {
-        text += (name == status.sourcesFailed.front() ? ", but not " : ", ") + printable(name);
-    }
-    return text;
-}
-
-bool hasCollected(const DaemonStatus& status) {
-    return !status.sourcesAnswered.empty() || !status.sourcesFailed.empty();
-}
-
 std::string statusJson(const DaemonStatus& status) {
     KSDictionary entries{{"Version", status.version},
                          {"DatabaseAvailable", status.databaseAvailable},
@@ -237,9 +222,7 @@ std::string statusJson(const DaemonStatus& status) {
                          {"BundleCount", status.bundleCount},
                          {"FilesIndexed", status.filesIndexed},
                          {"FilesRefused", status.filesRefused},
-                         {"SourcesAnswered", arrayOf(status.sourcesAnswered)},
-                         {"SourcesFailed", arrayOf(status.sourcesFailed)},
-                         {"Problems", arrayOf(status.problems)}};
+                         {"Problems", KSArray(status.problems.begin(), status.problems.end())}};
     if (status.lastCollection != 0) entries["LastCollection"] = KSDate{status.lastCollection};
     return jsonText(jsonForm(KSValue(entries))).value_or("{}") + "\n";
 }
@@ -251,7 +234,6 @@ std::string statusText(const DaemonStatus& status, const Screen& screen) {
     text += fmt::format("  Database         {}\n",
                         status.databaseAvailable ? "available" : "not available");
     text += fmt::format("  Last collection  {}\n", last);
-    if (hasCollected(status)) text += fmt::format("  Sources          {}\n", sourcesText(status));
     text += fmt::format("  Activities       collection {}, compute {}, purge {}\n",
                         onOff(status.collectEnabled), onOff(status.computeEnabled),
                         onOff(status.purgeEnabled));
@@ -343,23 +325,6 @@ int doWork(const Console& console, Work work) {
     if (error) return console.fail(*error);
     console.endProgress();
     return console.print(console.json() ? "{\"done\":true}\n" : "done\n");
-}
-
-int collectEvents(const Console& console) {
-    const auto client = console.connect();
-    if (!client) return console.fail(client.error());
-    if (const auto error = (*client)->collectEvents()) return console.fail(*error);
-    console.endProgress();
-    const auto status = (*client)->status();
-    if (!status) return console.fail(status.error());
-    if (console.json()) {
-        const KSDictionary done{{"done", true},
-                                {"sourcesAnswered", arrayOf(status->sourcesAnswered)},
-                                {"sourcesFailed", arrayOf(status->sourcesFailed)}};
-        return console.print(jsonText(jsonForm(KSValue(done))).value_or("{}") + "\n");
-    }
-    return console.print(hasCollected(*status) ? fmt::format("done: {}\n", sourcesText(*status))
-                                               : "done\n");
 }
 
 int clearEvents(const Console& console, bool yes) {

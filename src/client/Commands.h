@@ -32,8 +32,6 @@ int showTrends(const Console& console, const std::string& file, const std::strin
 /// One of the operations that take nothing and answer nothing.
 using Work = OptionalError (ConduitClient::*)();
 int doWork(const Console& console, Work work);
-/// Collects, and says which sources answered.
-int collectEvents(const Console& console);
 /// Asks on the terminal first, unless `yes`.
 int clearEvents(const Console& console, bool yes);
 

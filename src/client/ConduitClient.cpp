@@ -256,8 +256,6 @@ bool readProperty(std::string_view name, KeyedDecoder& in, DaemonStatus& status)
     if (name == "BundleCount") return in.readUnsigned(status.bundleCount);
     if (name == "FilesIndexed") return in.readUnsigned(status.filesIndexed);
     if (name == "FilesRefused") return in.readUnsigned(status.filesRefused);
-    if (name == "SourcesAnswered") return in.readStrings(status.sourcesAnswered);
-    if (name == "SourcesFailed") return in.readStrings(status.sourcesFailed);
     if (name == "Problems") return in.readStrings(status.problems);
     return in.skip();
 }

@@ -82,7 +82,7 @@ class CommandLine {
         const auto work = [](Work operation) {
             return [operation](const Console& console) { return doWork(console, operation); };
         };
-        add(app_, "collect", "Collect new events now", collectEvents);
+        add(app_, "collect", "Collect new events now", work(&ConduitClient::collectEvents));
         add(app_, "bundle", "Bundle the events now", work(&ConduitClient::bundleEvents));
         add(app_, "analytics", "Run the analytics now", work(&ConduitClient::runAnalytics));
         add(app_, "purge", "Delete what has expired", work(&ConduitClient::purgeEvents));

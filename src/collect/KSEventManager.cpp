@@ -2,6 +2,7 @@
 #include "collect/KSEventManager.h"
 
 #include <fmt/format.h>
+#include <fmt/ranges.h>
 
 #include <algorithm>
 #include <mutex>
@@ -11,6 +12,7 @@
 #include "core/Clock.h"
 #include "core/KSAssertion.h"
 #include "core/Log.h"
+#include "core/Problems.h"
 #include "core/ResultKeys.h"
 #include "core/TaskGroup.h"
 #include "model/KSExtensions.h"
@@ -163,6 +165,20 @@ void KSEventManager::collectEventsBetweenStartDate(KSDate start, KSDate end,
     });
 }
 
+/// Into the log and, when a source failed, among what the owner should know.
+void KSEventManager::tellOutcome(CollectionOutcome outcome) {
+    if (outcome.failed.empty()) {
+        logInfo(fmt::format("collected, {} sources answered", outcome.answered.size()));
+    } else {
+        const auto line = fmt::format("collected, {} sources answered, but not {}",
+                                      outcome.answered.size(), fmt::join(outcome.failed, ", "));
+        logWarning(line);
+        platform_.problems->add(line);
+    }
+    const std::lock_guard lock(outcomeMutex_);
+    outcome_ = std::move(outcome);
+}
+
 void KSEventManager::_collectEventsBetweenStartDate(KSDate start, KSDate end,
                                                     const ResultHandler& handler) {
     const auto tally = std::make_shared<Tally>();
@@ -188,10 +204,7 @@ void KSEventManager::_collectEventsBetweenStartDate(KSDate start, KSDate end,
         (tally->hasFailed(step.successKey) ? outcome.failed : outcome.answered)
             .push_back(sourceName(step.successKey));
     }
-    {
-        const std::lock_guard lock(outcomeMutex_);
-        outcome_ = std::move(outcome);
-    }
+    tellOutcome(std::move(outcome));
     handler(std::nullopt, tally->result());
 }
 

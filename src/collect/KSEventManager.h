@@ -89,6 +89,7 @@ class KSEventManager final : public KSService {
     void _fetchEventsWithOptions(const KSEventFetchOptions& options, const EventsHandler& handler);
     void _collectEvents(const ResultHandler& handler);
     void _collectEventsBetweenStartDate(KSDate start, KSDate end, const ResultHandler& handler);
+    void tellOutcome(CollectionOutcome outcome);
     void _runAnalytics(const ResultHandler& handler);
     void _cleanUpEvents(const ResultHandler& handler);
     void _purgeEventsDeletedAtSources(ResultHandler handler);

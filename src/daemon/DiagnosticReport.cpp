@@ -21,6 +21,7 @@
 #include "platform/PowerSources.h"
 #include "platform/SystemNotifications.h"
 #include "service/StatusReporter.h"
+#include "store/KSPersistenceManager.h"
 
 namespace keepsakes {
 
@@ -139,7 +140,7 @@ std::vector<std::string> DiagnosticReport::countLines() const {
     const auto reply = std::make_shared<Reply>();
     Semaphore answered;
     StatusReporter reporter(universe_.platform(),
-                            universe_.service<KSEventManager>("EventManager"));
+                            universe_.service<KSPersistenceManager>("PersistenceManager"));
     reporter.status([reply, answered](DaemonStatus status) mutable {
         {
             const std::lock_guard lock(reply->mutex);
@@ -151,13 +152,14 @@ std::vector<std::string> DiagnosticReport::countLines() const {
     const std::lock_guard lock(reply->mutex);
     if (!reply->status) return {"the database is busy"};
     const auto& status = *reply->status;
+    const auto outcome = universe_.service<KSEventManager>("EventManager")->lastOutcome();
     std::vector<std::string> lines = {
         fmt::format("database {}, last collection {}", status.databaseAvailable ? "open" : "closed",
                     status.lastCollection == 0 ? "never" : formatISO8601({status.lastCollection})),
         fmt::format("events {}, bundles {}", status.eventCount, status.bundleCount),
         fmt::format("files indexed {}, refused {}", status.filesIndexed, status.filesRefused),
-        fmt::format("sources answered {}, failed {}", status.sourcesAnswered.size(),
-                    status.sourcesFailed.size()),
+        fmt::format("sources answered {}, failed {}", outcome.answered.size(),
+                    outcome.failed.size()),
         fmt::format("problems {}", status.problems.size()),
     };
     for (const auto& problem : status.problems) lines.push_back("  " + problem);

@@ -11,6 +11,7 @@
 #include "platform/PlatformServices.h"
 #include "service/KSDaemonClient.h"
 #include "service/StatusReporter.h"
+#include "store/KSPersistenceManager.h"
 #include "wire/BusListener.h"
 
 namespace keepsakes {
@@ -38,12 +39,12 @@ std::shared_ptr<KSManageServer> KSManageServer::initWithUniverse(const ServiceLo
         assertParameter(eventBundleManager != nullptr, "eventBundleManager", kUnit, __LINE__);
     if (!good) return nullptr;
     const auto& platform = universe.platform();
-    auto status = std::make_unique<StatusReporter>(platform, eventManager);
-    std::shared_ptr<KSManageServer> server(
-        new KSManageServer(platform,
-                           std::make_unique<KSDaemonClient>(platform, std::move(eventManager),
-                                                            std::move(eventBundleManager)),
-                           std::move(status)));
+    auto persistenceManager = eventManager->persistenceManager();
+    std::shared_ptr<KSManageServer> server(new KSManageServer(
+        platform,
+        std::make_unique<KSDaemonClient>(platform, std::move(eventManager),
+                                         std::move(eventBundleManager)),
+        std::make_unique<StatusReporter>(platform, std::move(persistenceManager))));
     if (platform.listener) platform.listener->resume(*server->client_, *server->status_);
     logInfo("initiate managerSever");
     return server;

@@ -3,7 +3,6 @@
 
 #include <utility>
 
-#include "collect/KSEventManager.h"
 #include "core/Problems.h"
 #include "platform/DeviceDataIndex.h"
 #include "platform/PlatformServices.h"
@@ -12,24 +11,20 @@
 namespace keepsakes {
 
 StatusReporter::StatusReporter(const PlatformServices& platform,
-                               std::shared_ptr<KSEventManager> eventManager)
-    : platform_(platform), eventManager_(std::move(eventManager)) {}
+                               std::shared_ptr<KSPersistenceManager> persistenceManager)
+    : platform_(platform), persistenceManager_(std::move(persistenceManager)) {}
 
 DaemonStatus StatusReporter::withoutCounts() const {
     DaemonStatus status;
     status.version = KEEPSAKES_VERSION;
-    const auto& persistenceManager = *eventManager_->persistenceManager();
-    status.databaseAvailable = persistenceManager.isAvailable();
-    status.lastCollection = persistenceManager.getCollectionDate().value_or(KSDate{}).seconds;
+    status.databaseAvailable = persistenceManager_->isAvailable();
+    status.lastCollection = persistenceManager_->getCollectionDate().value_or(KSDate{}).seconds;
     status.collectEnabled = platform_.switches.collectEnabled;
     status.computeEnabled = platform_.switches.computeEnabled;
     status.purgeEnabled = platform_.switches.purgeEnabled;
     const auto scan = platform_.deviceData->lastReport();
     status.filesIndexed = scan.filesIndexed;
     status.filesRefused = scan.filesRefused;
-    auto outcome = eventManager_->lastOutcome();
-    status.sourcesAnswered = std::move(outcome.answered);
-    status.sourcesFailed = std::move(outcome.failed);
     status.problems = platform_.problems->list();
     status.problems.insert(status.problems.end(), scan.problems.begin(), scan.problems.end());
     if (status.problems.size() > Problems::kMost) status.problems.resize(Problems::kMost);
@@ -39,15 +34,14 @@ DaemonStatus StatusReporter::withoutCounts() const {
 void StatusReporter::status(std::function<void(DaemonStatus)> reply) {
     queue_.async([this, reply = std::move(reply)] {
         // Whoever asks first is told what a request would find, which opens the database.
-        auto& persistenceManager = *eventManager_->persistenceManager();
-        persistenceManager.checkAvailabilityWithCompletionHandler(
+        persistenceManager_->checkAvailabilityWithCompletionHandler(
             [](bool, const OptionalError&) {});
         auto status = withoutCounts();
         if (!status.databaseAvailable) {
             reply(std::move(status));
             return;
         }
-        persistenceManager.performBlock([status, reply](ManagedObjectContext& context) mutable {
+        persistenceManager_->performBlock([status, reply](ManagedObjectContext& context) mutable {
             status.eventCount = context.countOf("KSEventMO");
             status.bundleCount = context.countOf("KSEventBundleMO");
             reply(std::move(status));

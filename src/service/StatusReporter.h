@@ -8,14 +8,15 @@
 
 namespace keepsakes {
 
-class KSEventManager;
+class KSPersistenceManager;
 struct PlatformServices;
 
-/// Gathers the daemon's status: counts from the database, the last scan and collection, the
-/// problems. Owned by the server; any thread may ask and never waits.
+/// Gathers the daemon's status: counts from the database, the last scan, the problems. Owned by
+/// the server; any thread may ask and never waits.
 class StatusReporter final : public StatusSource {
   public:
-    StatusReporter(const PlatformServices& platform, std::shared_ptr<KSEventManager> eventManager);
+    StatusReporter(const PlatformServices& platform,
+                   std::shared_ptr<KSPersistenceManager> persistenceManager);
 
     void status(std::function<void(DaemonStatus)> reply) override;
 
@@ -23,7 +24,7 @@ class StatusReporter final : public StatusSource {
     DaemonStatus withoutCounts() const;
 
     const PlatformServices& platform_;
-    const std::shared_ptr<KSEventManager> eventManager_;
+    const std::shared_ptr<KSPersistenceManager> persistenceManager_;
     WorkQueue queue_{"StatusReporter"};
 };
 

@@ -54,9 +54,6 @@ struct DaemonStatus {
     std::uint64_t bundleCount = 0;
     std::uint64_t filesIndexed = 0;
     std::uint64_t filesRefused = 0;
-    /// Of the last collection since the daemon started: "Workouts", "Topics".
-    std::vector<std::string> sourcesAnswered;
-    std::vector<std::string> sourcesFailed;
     std::vector<std::string> problems;  ///< Newest first, at most 50.
 };
 

@@ -56,8 +56,6 @@ constexpr auto kProperties = std::to_array<Property>({
     {"BundleCount", "t", kAppend<&Status::bundleCount>},
     {"FilesIndexed", "t", kAppend<&Status::filesIndexed>},
     {"FilesRefused", "t", kAppend<&Status::filesRefused>},
-    {"SourcesAnswered", "as", kAppend<&Status::sourcesAnswered>},
-    {"SourcesFailed", "as", kAppend<&Status::sourcesFailed>},
     {"Problems", "as", kAppend<&Status::problems>},
 });
 

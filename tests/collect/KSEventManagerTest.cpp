@@ -106,6 +106,8 @@ TEST_F(Manager, ASilentSourceCostsTwoMinutesAndOnlyItself) {
                                R"("stateDatabaseAvailable": true})");
     EXPECT_THAT(events->lastOutcome().answered, ElementsAre("Photos", "Topics", "Music"));
     EXPECT_THAT(events->lastOutcome().failed, ElementsAre("Workouts"));
+    EXPECT_THAT(platform.problems.list(),
+                ElementsAre("collected, 3 sources answered, but not Workouts"));
 }
 
 TEST_F(Manager, FetchesInTheOrderAskedForWithDetailsFilledInAgain) {

@@ -175,7 +175,7 @@ TEST_F(Client, StatusCountsAndNamesProblems) {
     platform.problems.add("older");
     platform.problems.add("newer");
     platform.deviceData.report = {true, 12, 3, {"a file"}};
-    StatusReporter reporter(platform.services, universe->service<KSEventManager>("EventManager"));
+    StatusReporter reporter(platform.services, manager);
     DaemonStatus status;
     reporter.status([&status](DaemonStatus answer) { status = std::move(answer); });
     WorkerThreads::shared().settle();

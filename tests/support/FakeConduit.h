@@ -170,8 +170,6 @@ class FakeConduit final : public KSKeepsakesConduitProtocol, public StatusSource
             status.lastCollection = 700000000.5;
             status.purgeEnabled = true;
             status.eventCount = events_.size();
-            status.sourcesAnswered = {"Workouts", "Visits"};
-            status.sourcesFailed = {"Topics", "Trips"};
             status.problems = problems_;
             lock.unlock();
             reply(std::move(status));
