@@ -214,15 +214,19 @@ void FakeSearchIndex::start(const SearchQuery& query, const FoundItems& found,
 }
 
 template <class Item>
-OptionalError FakeProfileEventStore::tell(std::vector<Item>& items, KSDateInterval window,
+OptionalError FakeProfileEventStore::tell(std::vector<Item> items, KSDateInterval window,
                                           const Each<Item>& each) {
-    asked.push_back(window);
+    {
+        const std::lock_guard lock(mutex_);
+        asked.push_back(window);
+    }
     hold.pass();
     std::ranges::stable_sort(items, {}, [](const Item& item) { return item.startDate; });
     for (const auto& item : items) {
         const bool overlaps = item.startDate <= window.end && item.endDate >= window.start;
         if (overlaps && !each(item)) break;
     }
+    const std::lock_guard lock(mutex_);
     return std::exchange(nextError, std::nullopt);
 }
 

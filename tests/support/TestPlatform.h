@@ -209,7 +209,9 @@ class FakeProfileEventStore final : public ProfileEventStore {
 
   private:
     template <class Item>
-    OptionalError tell(std::vector<Item>& items, KSDateInterval window, const Each<Item>& each);
+    OptionalError tell(std::vector<Item> items, KSDateInterval window, const Each<Item>& each);
+
+    std::mutex mutex_;  // trips and suggested events are asked for on queues of their own
 };
 
 /// The owner's calendars in memory, likewise.
