@@ -17,14 +17,15 @@ namespace {
 
 using namespace keepsakes;
 
-/// Songs of three minutes, one after the other; a hundred of them over and over.
+/// A hundred songs over and over, ten players at a time, a minute of each.
 void fill(SQLite::Database& file, KSDate end) {
     SQLite::Statement insert(
         file,
         "WITH RECURSIVE n(i) AS (SELECT 0 UNION ALL SELECT i + 1 FROM n WHERE i < ?) "
         "INSERT INTO records(timestamp, state, duration, title, album, artist, bundleID) "
-        "SELECT ? - 6.0 * i, CASE i % 2 WHEN 0 THEN 4 ELSE 1 END, 180,"
-        " 'Song number ' || (i / 2 % 100), 'An album', 'An artist', 'org.example.Music'"
+        "SELECT ? - 6.0 * i, CASE WHEN i % 20 < 10 THEN 4 ELSE 1 END, 180,"
+        " 'Song number ' || ((i / 20 * 10 + i % 10) % 100), 'An album', 'An artist',"
+        " 'org.example.Music'"
         " FROM n ORDER BY i DESC");
     insert.bind(1, MediaStreamFile::kMostRecords - 1);
     insert.bind(2, end.seconds);
