@@ -60,7 +60,7 @@ std::string shownEnd(KSDate start, KSDate end) {
 
 /// "2024-06-15 10:02 to 12:31", "2024-06-15, all day", "2024-06-15 10:02".
 std::string shownSpan(KSDate start, KSDate end) {
-    const auto from = shownStart(start, end);
+    auto from = shownStart(start, end);
     const auto to = shownEnd(start, end);
     if (to.empty()) return from;
     return to == kAllDay ? fmt::format("{}, {}", from, to) : fmt::format("{} to {}", from, to);

@@ -114,7 +114,7 @@ class Journey {
         const auto of = [](KSDate date, std::string_view pattern) {
             return calendar::format(date, pattern);
         };
-        const auto last = of(end, "d MMMM");
+        auto last = of(end, "d MMMM");
         if (of(trip.startDate, "yyyy") != of(end, "yyyy")) {
             return of(trip.startDate, "d MMMM yyyy") + " to " + of(end, "d MMMM yyyy");
         }

@@ -71,6 +71,7 @@ std::shared_ptr<KSEvent> KSForesightTravelManager::createEventFromTrip(const Tri
 
 std::string KSForesightTravelManager::_providerIdOfTrip(const Trip& trip) {
     std::vector<std::string> parts;
+    parts.reserve(trip.tripParts.size());
     for (const auto& part : trip.tripParts) {
         parts.push_back(fmt::format("{}", fmt::join(part.eventIdentifiers, ":")));
     }
