@@ -216,18 +216,14 @@ struct CompiledPhrase {
 
 const std::vector<CompiledPhrase>& phrases() {
     static const auto compiled = [] {
-        std::vector<CompiledPhrase> all;
-        for (const auto& rule : kPhrases) all.emplace_back(rule);
-        return all;
+        return std::vector<CompiledPhrase>(std::begin(kPhrases), std::end(kPhrases));
     }();
     return compiled;
 }
 
 const std::vector<Expression>& routes() {
     static const auto compiled = [] {
-        std::vector<Expression> all;
-        for (const auto* text : kRoutes) all.emplace_back(text);
-        return all;
+        return std::vector<Expression>(std::begin(kRoutes), std::end(kRoutes));
     }();
     return compiled;
 }

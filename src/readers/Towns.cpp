@@ -193,7 +193,7 @@ std::string townOfAddress(std::string_view address) {
     // "FI-02600 Espoo", "1012 AB Amsterdam": the words behind the postal code.
     for (const auto part : parts) {
         const auto digit = part.find_first_of("0123456789");
-        if (digit == std::string_view::npos || digit > 3) continue;
+        if (digit > 3) continue;
         const auto end = std::min(part.find_first_not_of("0123456789-", digit), part.size());
         if (end - digit < 4 || end == part.size() || part[end] != ' ') continue;
         auto town = trimmed(part.substr(end));

@@ -178,7 +178,7 @@ std::shared_ptr<KSEvent> KSLinkshelfManager::createEventFromSharedContent(
     if (!identifier || !created) return nullptr;
     const KSDate now = clock_.now();
     auto event =
-        KSEvent::initWithEventIdentifier(KSUUID::random(), *created, *created, now,
+        KSEvent::initWithEventIdentifier(KSUUID::random(), created, created, now,
                                          KSEventProvider::foresight, KSEventCategory::linkshelf);
     event->expirationDate = now + lifetime::kFourWeeks;
     event->identifierFromProvider = identifier;
