@@ -149,11 +149,7 @@ void KSRoutineServiceManager::fetchAndSaveVisitsBetweenStartDate(KSDate start, K
 
 void KSRoutineServiceManager::_fetchAndSaveVisitsBetweenStartDate(KSDate start, KSDate end,
                                                                   ResultHandler handler) {
-    KSEventPointer newest;
-    eventStore_->fetchLastEventOfCategory(
-        KSEventCategory::visit,
-        [&newest](const KSEventPointer& event, const OptionalError&) { newest = event; });
-    if (newest && start < newest->startDate()) start = newest->startDate();
+    start = std::max(start, startOfNewestVisit());
     if (start > end) {
         handler(std::nullopt, {});
         return;
@@ -168,6 +164,15 @@ void KSRoutineServiceManager::_fetchAndSaveVisitsBetweenStartDate(KSDate start, 
                                     saveVisits(fetched, start, handler);
                                 }
                             });
+}
+
+KSDate KSRoutineServiceManager::startOfNewestVisit() const {
+    auto start = KSDate::distantPast();
+    eventStore_->fetchLastEventOfCategory(
+        KSEventCategory::visit, [&start](const KSEventPointer& newest, const OptionalError&) {
+            if (newest) start = newest->startDate();
+        });
+    return start;
 }
 
 void KSRoutineServiceManager::saveVisits(const Fetched& fetched, KSDate after,
@@ -185,6 +190,11 @@ void KSRoutineServiceManager::saveVisits(const Fetched& fetched, KSDate after,
         });
     }
     group->notify(queue_, [this, fresh, handler = std::move(handler)] {
+        // A collection that began while the service hung asked for the same visits; of the two,
+        // the one that is answered first stores them.
+        const auto stored = startOfNewestVisit();
+        std::erase_if(*fresh,
+                      [stored](const auto& event) { return event->startDate() <= stored; });
         if (fresh->empty()) {
             handler(std::nullopt, {});
         } else {

@@ -67,6 +67,8 @@ class KSRoutineServiceManager final : public KSService {
     void _fetchAndSaveVisitsBetweenStartDate(KSDate start, KSDate end, ResultHandler handler);
     void fetchVisitsAndLocations(KSDate start, KSDate end,
                                  std::function<void(const Fetched&)> handler);
+    /// The distant past when none is stored.
+    KSDate startOfNewestVisit() const;
     void saveVisits(const Fetched& fetched, KSDate after, ResultHandler handler);
     void _rehydrateVisits(const KSEventArray& events, EventsHandler handler);
     void _removeVisitsDeletedAtSource(KSEventArray events, ResultHandler handler);
