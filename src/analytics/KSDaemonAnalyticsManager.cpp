@@ -14,6 +14,7 @@
 #include "core/Clock.h"
 #include "core/Files.h"
 #include "core/KSAssertion.h"
+#include "core/KSDate.h"
 #include "core/Log.h"
 #include "core/PropertyList.h"
 #include "core/ResultKeys.h"
@@ -25,11 +26,8 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSDaemonAnalyticsManager";
 constexpr std::string_view kEvent = "com.brindle.Keepsakes.Daemon";
 constexpr const char* kHistoryFile = "daemonTriggerPersistence.plist";
-constexpr double kHour = 3600;
-constexpr double kDay = 24 * kHour;
 constexpr std::int64_t kNoEarlierTime = -1;
 
 constexpr std::string_view kLastLaunch = "lastLaunch";

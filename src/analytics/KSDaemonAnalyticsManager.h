@@ -62,6 +62,8 @@ class KSDaemonAnalyticsManager final : public KSService {
     void sendDataToAnalyticsService(const KSDictionary& payload) const;
 
   private:
+    static constexpr std::string_view kUnit = "KSDaemonAnalyticsManager";
+
     using Notifiers = std::array<std::shared_ptr<KSNotifier>, 5>;
 
     explicit KSDaemonAnalyticsManager(const PlatformServices& platform);

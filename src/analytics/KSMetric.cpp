@@ -13,8 +13,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSMetric";
-
 KSError invalid(std::string_view text) {
     return KSError::make(KSErrorCode::invalidParameter, text);
 }

@@ -61,6 +61,8 @@ class KSMetric {
                                       const std::vector<double>& bins);
 
   private:
+    static constexpr std::string_view kUnit = "KSMetric";
+
     AnalyticsService& analytics_;
     const bool loggingEnabled_;
     bool submitted_ = false;

@@ -12,6 +12,7 @@
 #include "collect/KSEventManager.h"
 #include "core/Clock.h"
 #include "core/KSAssertion.h"
+#include "core/KSDate.h"
 #include "core/ResultKeys.h"
 #include "platform/PlatformServices.h"
 #include "store/Availability.h"
@@ -21,9 +22,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSEventBundleManager";
-
-constexpr double kDay = 86400;
 constexpr double kStoredWindow = 7 * kDay;
 constexpr double kRecently = 3 * kDay;
 constexpr std::array kWindows = {28 * kDay, 21 * kDay, 14 * kDay, kStoredWindow,

@@ -5,6 +5,7 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <string_view>
 
 #include "bundle/KSEventBundler.h"
 #include "core/KSError.h"
@@ -55,6 +56,8 @@ class KSEventBundleManager final : public KSService {
     }
 
   private:
+    static constexpr std::string_view kUnit = "KSEventBundleManager";
+
     KSEventBundleManager(Clock& clock, std::shared_ptr<KSEventBundleStore> eventBundleStore,
                          std::shared_ptr<KSEventManager> eventManager);
 

@@ -14,7 +14,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSEventBundler";
 /// Widens each event on both sides before events are compared.
 constexpr double kMarginSeconds = 0;
 constexpr double kOverlapAbove = 0;

@@ -5,6 +5,7 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <string_view>
 
 #include "model/KSEvent.h"
 #include "model/KSEventBundle.h"
@@ -38,6 +39,8 @@ class KSEventBundler final {
     static std::function<bool(const KSEvent&)> predicateForBasicFilteringOfEvents();
 
   private:
+    static constexpr std::string_view kUnit = "KSEventBundler";
+
     KSEventBundler(KSDate startDate, KSDate endDate, KSDate now);
 
     const KSDate startDate_;

@@ -129,19 +129,19 @@ constexpr std::string_view kOwnLinkSentence = "A link you shared";
 /// What a finding of an analysis is called.
 constexpr std::string_view kTrendSentence = "A trend";
 
-constexpr std::string_view kDay = "EEEE";
+constexpr std::string_view kWeekday = "EEEE";
 constexpr std::string_view kTime = "HH:mm";
 
 std::string timeText(KSDateInterval span) {
-    const auto day = calendar::format(span.start, kDay);
+    const auto day = calendar::format(span.start, kWeekday);
     const auto from = calendar::format(span.start, kTime);
     const auto to = calendar::format(span.end, kTime);
     if (calendar::isWholeDays(span)) {
-        const auto last = calendar::format(span.end - 1, kDay);
+        const auto last = calendar::format(span.end - 1, kWeekday);
         return last == day ? day : fmt::format("{} to {}", day, last);
     }
     if (calendar::startOfDay(span.start) != calendar::startOfDay(span.end)) {
-        return fmt::format("{} {} to {} {}", day, from, calendar::format(span.end, kDay), to);
+        return fmt::format("{} {} to {} {}", day, from, calendar::format(span.end, kWeekday), to);
     }
     return from == to ? fmt::format("{} {}", day, from) : fmt::format("{} {} to {}", day, from, to);
 }

@@ -4,6 +4,7 @@
 #include <systemd/sd-bus.h>
 
 #include <memory>
+#include <string_view>
 
 namespace keepsakes::bus {
 
@@ -19,5 +20,11 @@ struct Unref {
 using Connection = std::unique_ptr<sd_bus, Unref>;
 using Message = std::unique_ptr<sd_bus_message, Unref>;
 using Slot = std::unique_ptr<sd_bus_slot, Unref>;
+
+/// A text of the library's, which gives none as a null pointer.
+inline std::string_view view(const char* text) { return text ? text : ""; }
+
+/// The library counts time in microseconds.
+inline constexpr double kMicroseconds = 1e6;
 
 }  // namespace keepsakes::bus

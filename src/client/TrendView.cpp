@@ -9,13 +9,13 @@
 #include <utility>
 
 #include "client/RecordJson.h"
+#include "core/KSDate.h"
 #include "trends/TrendWords.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kDay = 86400;
 constexpr std::size_t kDays = 28;
 constexpr std::size_t kDaysOfAWeek = 7;
 constexpr auto kBars = std::to_array<std::string_view>({"▁", "▂", "▃", "▄", "▅", "▆", "▇", "█"});

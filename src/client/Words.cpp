@@ -5,14 +5,13 @@
 #include <cstdint>
 
 #include "core/Calendar.h"
+#include "core/KSDate.h"
 #include "core/Text.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kHour = 3600;
-constexpr double kDay = 24 * kHour;
 constexpr std::size_t kDateOnly = std::string_view("2024-06-15").size();
 
 template <class Number>

@@ -29,7 +29,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSEventManager";
 constexpr const char* kCollectionStartKey = "EventManagerEventCollectionStartDate";
 
 /// What several branches of one operation report, whichever thread they end on.

@@ -6,6 +6,7 @@
 #include <memory>
 #include <mutex>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "core/KSError.h"
@@ -80,6 +81,8 @@ class KSEventManager final : public KSService {
     CollectionOutcome lastOutcome() const;
 
   private:
+    static constexpr std::string_view kUnit = "KSEventManager";
+
     KSEventManager(const PlatformServices& platform,
                    std::shared_ptr<KSDefaultsManager> defaultsManager,
                    std::shared_ptr<KSEventStore> eventStore, std::unique_ptr<EventSources> sources);

@@ -10,7 +10,7 @@ namespace {
 
 using nlohmann::json;
 
-constexpr int kDeepest = 64;
+constexpr int kDeepestJson = 64;
 
 struct NotWritable {};
 
@@ -86,7 +86,7 @@ std::optional<KSValue> parseJson(std::string_view text) {
     const auto limitDepth = [&tooDeep](int depth, json::parse_event_t event, json&) {
         const bool opens =
             event == json::parse_event_t::array_start || event == json::parse_event_t::object_start;
-        tooDeep |= opens && depth >= kDeepest;
+        tooDeep |= opens && depth >= kDeepestJson;
         return !tooDeep;
     };
     try {

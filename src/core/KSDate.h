@@ -8,6 +8,10 @@
 
 namespace keepsakes {
 
+/// In seconds; a day of the calendar may be longer or shorter.
+inline constexpr double kHour = 3600;
+inline constexpr double kDay = 24 * kHour;
+
 /// An instant: seconds since 2001-01-01 00:00:00 UTC, fractions allowed. A plain value.
 struct KSDate {
     double seconds = 0;

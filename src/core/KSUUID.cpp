@@ -6,19 +6,14 @@
 #include <cstring>
 #include <system_error>
 
+#include "core/Text.h"
+
 namespace keepsakes {
 
 namespace {
 
 constexpr bool hyphenBefore(std::size_t byte) {
     return byte == 4 || byte == 6 || byte == 8 || byte == 10;
-}
-
-int hexDigit(char c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
-    return -1;
 }
 
 }  // namespace

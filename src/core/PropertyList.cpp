@@ -11,13 +11,14 @@
 #include <vector>
 
 #include "core/Files.h"
+#include "core/Text.h"
 
 namespace keepsakes {
 
 namespace {
 
 constexpr std::uintmax_t kLargestFile = 16u << 20;
-constexpr int kDeepest = 64;
+constexpr int kDeepestNode = 64;
 constexpr std::string_view kErrorDomain = "PropertyListErrorDomain";
 constexpr std::string_view kBase64 =
     "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
@@ -118,14 +119,6 @@ std::optional<Number> parseNumber(std::string_view text) {
     return error == std::errc{} && rest == end ? std::optional(number) : std::nullopt;
 }
 
-constexpr std::string_view kBlank = " \t\r\n";
-
-std::string_view trimmed(std::string_view text) {
-    const auto first = text.find_first_not_of(kBlank);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kBlank) - first + 1);
-}
-
 /// All the text in a node, which holds nothing else.
 std::expected<std::string, KSError> textOf(const pugi::xml_node& node) {
     std::string text;
@@ -185,7 +178,7 @@ std::expected<KSValue, KSError> readArray(const pugi::xml_node& node, int depth)
 }
 
 std::expected<KSValue, KSError> readNode(const pugi::xml_node& node, int depth) {
-    if (depth > kDeepest) return failure(1, "property list: nested too deeply");
+    if (depth > kDeepestNode) return failure(1, "property list: nested too deeply");
     const std::string_view kind = node.name();
     if (kind == "dict") return readDictionary(node, depth);
     if (kind == "array") return readArray(node, depth);

@@ -17,6 +17,12 @@ std::string lowerCased(std::string_view text) {
     return lowered;
 }
 
+std::string_view trimmed(std::string_view text, std::string_view blanks) {
+    const auto first = text.find_first_not_of(blanks);
+    if (first == std::string_view::npos) return {};
+    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
 bool isPlainUtf8(std::string_view text) {
     // Nearly all text is ASCII, and this much of the test the compiler makes fast.
     bool ascii = true;

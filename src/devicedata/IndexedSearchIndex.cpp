@@ -18,7 +18,7 @@ constexpr std::string_view kErrorDomain = "SearchIndexErrorDomain";
 
 using Clauses = std::vector<SearchClause>;
 
-constexpr auto kTexts = std::to_array<std::string_view>(
+constexpr auto kItemTexts = std::to_array<std::string_view>(
     {searchkey::kUniqueIdentifier, searchkey::kURL, searchkey::kAuthorAddresses,
      searchkey::kAuthorContactIdentifiers, searchkey::kAccountIdentifier,
      searchkey::kAccountHandles, searchkey::kRecipientAddresses, searchkey::kDisplayName,
@@ -39,7 +39,7 @@ bool isIn(const std::array<std::string_view, N>& names, std::string_view name) {
 /// An attribute that no item has, or one of another kind than what it is compared with, would
 /// quietly find nothing.
 bool isAnswerable(const SearchClause& clause) {
-    const bool isText = isIn(kTexts, clause.name);
+    const bool isText = isIn(kItemTexts, clause.name);
     const bool isDate = isIn(kDates, clause.name);
     const bool isNumber = isIn(kNumbers, clause.name);
     if (clause.kind == SearchClause::Kind::exists) return isText || isDate || isNumber;

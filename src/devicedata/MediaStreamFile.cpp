@@ -16,6 +16,7 @@
 
 #include "core/Clock.h"
 #include "core/Files.h"
+#include "core/KSDate.h"
 #include "core/Log.h"
 #include "core/Problems.h"
 
@@ -25,7 +26,6 @@ namespace {
 
 constexpr int kVersion = 1;
 constexpr int kBusyMilliseconds = 5000;
-constexpr double kDay = 86400;
 
 // Instants are seconds since 2001-01-01 UTC; "duration" is the item's length in whole seconds,
 // "state" as the port counts it. Records stand in the order of their arrival.
@@ -46,7 +46,7 @@ CREATE INDEX recordsByTimestamp ON records(timestamp);
 )sql";
 
 /// The texts of a record, in the order of their columns.
-constexpr std::array kTexts = {
+constexpr std::array kRecordTexts = {
     &NowPlayingRecord::title,
     &NowPlayingRecord::album,
     &NowPlayingRecord::artist,
@@ -94,7 +94,7 @@ NowPlayingRecord recordOf(SQLite::Statement& row) {
     record.playbackState = static_cast<PlaybackState>(row.getColumn(1).getInt64());
     record.duration = row.getColumn(2).getInt64();
     int index = kFirstText;
-    for (const auto member : kTexts) {
+    for (const auto member : kRecordTexts) {
         const auto column = row.getColumn(index++);
         if (!column.isNull()) record.*member = column.getString();
     }
@@ -122,7 +122,7 @@ OptionalError MediaStreamFile::append(const NowPlayingRecord& record) {
         insert.bind(2, static_cast<std::int64_t>(record.playbackState));
         insert.bind(3, record.duration);
         int index = kFirstText + 1;
-        for (const auto member : kTexts) {
+        for (const auto member : kRecordTexts) {
             if (const auto& text = record.*member) insert.bind(index, *text);
             ++index;
         }

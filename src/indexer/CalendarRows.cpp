@@ -4,18 +4,10 @@
 #include <fmt/format.h>
 #include <fmt/ranges.h>
 
+#include "indexer/IndexWriter.h"
 #include "readers/ReaderLimits.h"
 
 namespace keepsakes {
-
-namespace {
-
-void run(SQLite::Statement& statement) {
-    statement.exec();
-    statement.reset();
-}
-
-}  // namespace
 
 void putCalendar(IndexWriter& index, std::int64_t file, const FileRecords& records) {
     if (records.recurrencesOver) {
@@ -56,7 +48,7 @@ void putCalendar(IndexWriter& index, std::int64_t file, const FileRecords& recor
             put.bind(13, recognition->origin);
             put.bind(14, recognition->destination);
         }
-        run(put);
+        runOnce(put);
     }
 }
 

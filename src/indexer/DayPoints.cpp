@@ -68,10 +68,10 @@ struct Units {
 }  // namespace
 
 std::int64_t utcDayOf(KSDate time) {
-    return static_cast<std::int64_t>(std::floor(time.seconds / kSecondsPerDay));
+    return static_cast<std::int64_t>(std::floor(time.seconds / kDay));
 }
 
-KSDate startOfUtcDay(std::int64_t day) { return {static_cast<double>(day) * kSecondsPerDay}; }
+KSDate startOfUtcDay(std::int64_t day) { return {static_cast<double>(day) * kDay}; }
 
 void DayPoints::add(const TrackPoint& point) {
     if (!points_.empty() && stepOf(points_.back().time) == stepOf(point.time)) {

@@ -12,7 +12,6 @@ namespace keepsakes {
 
 /// Points are kept in steps of so many seconds; more of them tell nothing about a stay.
 inline constexpr double kPointStep = 10;
-inline constexpr double kSecondsPerDay = 86400;
 
 /// The UTC day of an instant, counted from 2001-01-01; only the index counts so.
 std::int64_t utcDayOf(KSDate time);

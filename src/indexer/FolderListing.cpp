@@ -138,7 +138,7 @@ bool isPassedOver(std::string_view name) {
            std::ranges::find(kNames, name) != kNames.end();
 }
 
-std::string printable(std::string_view text) {
+std::string escaped(std::string_view text) {
     std::string line;
     line.reserve(text.size());
     while (!text.empty()) {

@@ -39,6 +39,6 @@ bool isPassedOver(std::string_view name);
 
 /// A path or another text of strangers as one line of UTF-8: control characters and bytes that are
 /// not UTF-8 become \xHH.
-std::string printable(std::string_view text);
+std::string escaped(std::string_view text);
 
 }  // namespace keepsakes

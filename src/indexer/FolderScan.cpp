@@ -344,10 +344,10 @@ class Scan {
                         .refusedAt = options_.now};
         if (outcome.refusal) {
             row.state = refusedState;
-            row.reason = printable(outcome.refusal->text);
+            row.reason = escaped(outcome.refusal->text);
             ++summary_.refused[outcome.refusal->reason];
             if (row.reason != file.knownReason) {
-                logWarning(fmt::format("passed over {}: {}", printable(pathOf(file)), *row.reason));
+                logWarning(fmt::format("passed over {}: {}", escaped(pathOf(file)), *row.reason));
             }
         }
         if (outcome.records) {
@@ -363,7 +363,7 @@ class Scan {
 
     void tellRemarks(const ChangedFile& file, const std::vector<std::string>& remarks) {
         for (const auto& remark : remarks) {
-            const auto line = printable(fmt::format("{}: {}", pathOf(file), remark));
+            const auto line = escaped(fmt::format("{}: {}", pathOf(file), remark));
             logWarning(line);
             if (remarks_.size() < kMostProblems) remarks_.push_back(line);
         }
@@ -421,7 +421,7 @@ class Scan {
         auto refused = index_.refusedFiles(kMostProblems);
         std::ranges::reverse(refused);
         for (const auto& file : refused) {
-            reporter_.problem(fmt::format("passed over {}: {}", printable(file.path), file.reason));
+            reporter_.problem(fmt::format("passed over {}: {}", escaped(file.path), file.reason));
         }
         for (const auto& remark : remarks_) reporter_.problem(remark);
         for (const auto& problem : changes_.problems) {
@@ -463,7 +463,7 @@ OptionalError scanFolders(const ScanOptions& options, FileReader& reader, ReadMa
             if (!isDamaged || isSecond) {
                 return KSError::make(
                     kSQLiteErrorDomain, error.getExtendedErrorCode(),
-                    fmt::format("write {}: {}", printable(options.index.string()), error.what()));
+                    fmt::format("write {}: {}", escaped(options.index.string()), error.what()));
             }
             logWarning(fmt::format("the index is damaged ({}): it is built anew", error.what()));
         }

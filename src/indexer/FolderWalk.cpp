@@ -87,7 +87,7 @@ class Walk {
         kept_.push_back(path);
         if (changes_.problems.size() < kMostProblems) {
             changes_.problems.push_back(
-                fmt::format("cannot search the folder {}: {}", printable(path), why));
+                fmt::format("cannot search the folder {}: {}", escaped(path), why));
         }
     }
 

@@ -11,13 +11,12 @@
 
 #include "indexer/FolderListing.h"
 #include "indexer/OpenFile.h"
+#include "platform/GeoPoint.h"
 #include "readers/GazetteerReader.h"
 
 namespace keepsakes {
 
 namespace {
-
-constexpr double kMetresPerDegree = 111195;
 
 struct KnownGazetteer {
     std::string path;
@@ -69,7 +68,7 @@ std::optional<std::string> takeTowns(SQLite::Database& database, int fd) {
 std::optional<std::string> problemOf(const std::string& path,
                                      const std::optional<std::string>& reason) {
     if (!reason) return std::nullopt;
-    return fmt::format("passed over the gazetteer {}: {}", printable(path), *reason);
+    return fmt::format("passed over the gazetteer {}: {}", escaped(path), *reason);
 }
 
 }  // namespace

@@ -187,7 +187,7 @@ void IndexWriter::putFile(std::int64_t folder, const std::string& name, const In
     put.bind(8, static_cast<int>(file.state));
     bindBytes(put, 9, file.hash);
     if (file.reason) {
-        put.bind(10, printable(*file.reason));
+        put.bind(10, escaped(*file.reason));
         put.bind(11, file.refusedAt.seconds);
     }
     put.bind(12, static_cast<int>(file.mailbox));
@@ -352,7 +352,7 @@ void IndexWriter::putStatedVisit(std::int64_t file, const StatedVisit& visit, st
     put.bind(5, visit.stay.end.seconds);
     put.bind(6, visit.position.latitude);
     put.bind(7, visit.position.longitude);
-    if (!visit.name.empty()) put.bind(8, printable(visit.name));
+    if (!visit.name.empty()) put.bind(8, escaped(visit.name));
     put.bind(9, static_cast<int>(visit.use));
     put.bind(10, visit.confidence);
     put.exec();
@@ -372,7 +372,7 @@ void IndexWriter::putNamedPlace(std::int64_t file, const NamedPlace& place) {
     put.bind(1, file);
     put.bind(2, place.position.latitude);
     put.bind(3, place.position.longitude);
-    put.bind(4, printable(place.name));
+    put.bind(4, escaped(place.name));
     put.bind(5, static_cast<int>(place.use));
     put.bind(6, static_cast<int>(place.origin));
     put.exec();

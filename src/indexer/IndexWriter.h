@@ -37,6 +37,12 @@ struct RefusedFile {
     std::string reason;
 };
 
+/// Runs a statement that answers no rows, and makes it ready for the next time.
+inline void runOnce(SQLite::Statement& statement) {
+    statement.exec();
+    statement.reset();
+}
+
 /// The one writer of the index. Lives on the scan's thread. Its changes are kept together and
 /// become visible with `commit`. Throws `SQLite::Exception`, which the scan catches.
 class IndexWriter {

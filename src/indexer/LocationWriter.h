@@ -17,7 +17,7 @@ namespace keepsakes {
 inline constexpr std::uint64_t kMostStatedVisits = 50000;
 inline constexpr std::uint64_t kMostNamedPlaces = 20000;
 /// A stay that a file states for more seconds than 31 days is none.
-inline constexpr double kLongestStatedVisit = 31 * kSecondsPerDay;
+inline constexpr double kLongestStatedVisit = 31 * kDay;
 
 /// Takes what the file being read tells of places into the index, inside its pending changes, a day
 /// of points at a time: memory does not grow with the file. Lives with the scan, on its thread.

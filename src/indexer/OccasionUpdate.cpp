@@ -45,9 +45,9 @@ TrackZones loadZones(SQLite::Database& database) {
 }
 
 /// The former occasions and the new ones, and all that is written of the difference.
-class Update {
+class OccasionUpdate {
   public:
-    explicit Update(SQLite::Database& database) : database_(database) {}
+    explicit OccasionUpdate(SQLite::Database& database) : database_(database) {}
 
     void run() {
         loadPhotos();
@@ -223,7 +223,7 @@ class Update {
 }  // namespace
 
 void updateOccasions(IndexWriter& index) {
-    Update(index.database()).run();
+    OccasionUpdate(index.database()).run();
     index.setMeta(kMetaOccasionsStale, 0);
 }
 

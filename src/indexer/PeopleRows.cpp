@@ -3,17 +3,14 @@
 
 #include <cmath>
 
+#include "indexer/IndexWriter.h"
+
 namespace keepsakes {
 
 namespace {
 
 /// Handles kept in memory; a mailbox of strangers has no end of them.
 constexpr std::size_t kMostKnown = 50000;
-
-void run(SQLite::Statement& statement) {
-    statement.exec();
-    statement.reset();
-}
 
 }  // namespace
 
@@ -79,7 +76,7 @@ void PeopleRows::interaction(const InteractionRecord& record) {
         addInteraction_.bind(6, static_cast<int>(record.direction));
         if (!record.sender.empty()) addInteraction_.bind(7, idOf(record.sender));
         addInteraction_.bindNoCopy(8, recipients);
-        run(addInteraction_);
+        runOnce(addInteraction_);
         interaction_ = index_.database().getLastInsertRowid();
         start_ = record.start;
     });
@@ -101,7 +98,7 @@ void PeopleRows::link(const LinkRecord& link) {
         addLink_.bind(8, link.roomName);
         if (!link.account.empty()) addLink_.bind(9, idOf(link.account));
         addLink_.bind(10, link.isStarred ? 1 : 0);
-        run(addLink_);
+        runOnce(addLink_);
     });
 }
 
@@ -115,12 +112,12 @@ void PeopleRows::card(const ContactCard& card) {
         addCard_.bind(3, card.name);
         addCard_.bindNoCopy(4, handles);
         addCard_.bind(5, card.fromPhone ? 1 : 0);
-        run(addCard_);
+        runOnce(addCard_);
         for (const auto& relation : card.relations) {
             addRelation_.bind(1, file_);
             addRelation_.bind(2, relation.relationship);
             addRelation_.bind(3, relation.name);
-            run(addRelation_);
+            runOnce(addRelation_);
         }
     });
 }
@@ -130,7 +127,7 @@ void PeopleRows::ownerHandle(const std::string& handle) {
         changed();
         addOwner_.bind(1, file_);
         addOwner_.bind(2, idOf(handle));
-        run(addOwner_);
+        runOnce(addOwner_);
     });
 }
 
@@ -138,7 +135,7 @@ std::int64_t PeopleRows::idOf(const std::string& handle) {
     if (const auto known = known_.find(handle); known != known_.end()) return known->second;
     if (known_.size() >= kMostKnown) known_.clear();
     addHandle_.bind(1, handle);
-    run(addHandle_);
+    runOnce(addHandle_);
     findHandle_.bind(1, handle);
     findHandle_.executeStep();
     const auto id = findHandle_.getColumn(0).getInt64();

@@ -49,9 +49,9 @@ double hashOf(std::span<const std::string> addresses) {
     return static_cast<double>(std::hash<std::string>()(joined) >> 12U);
 }
 
-class Update {
+class PeopleUpdate {
   public:
-    Update(IndexWriter& index, std::span<const std::string> ownerAddresses, KSDate now)
+    PeopleUpdate(IndexWriter& index, std::span<const std::string> ownerAddresses, KSDate now)
         : database_(index.database()), ownerAddresses_(ownerAddresses), now_(now) {}
 
     void run() {
@@ -281,7 +281,7 @@ bool updatePeople(IndexWriter& index, std::span<const std::string> ownerAddresse
         return false;
     }
     index.begin();
-    Update update(index, ownerAddresses, now);
+    PeopleUpdate update(index, ownerAddresses, now);
     if (index.meta(kMetaHandlesLoose, 0) != 0) update.dropLooseHandles();
     update.run();
     index.setMeta(kMetaPeopleStale, 0);

@@ -19,7 +19,7 @@ constexpr const char* kPerformers = "performers";
 void put(KSDictionary& words, const char* key, const std::vector<std::string>& values) {
     if (values.empty()) return;
     KSArray array;
-    for (const auto& value : values) array.emplace_back(printable(value));
+    for (const auto& value : values) array.emplace_back(escaped(value));
     words.emplace(key, std::move(array));
 }
 
@@ -47,7 +47,7 @@ std::optional<std::string> wordsText(const PhotoRecord& photo) {
     put(words, kHolidays, photo.holidays);
     KSArray events;
     for (const auto& event : photo.publicEvents) {
-        KSDictionary dictionary{{kName, printable(event.name)}, {kVenue, printable(event.venue)}};
+        KSDictionary dictionary{{kName, escaped(event.name)}, {kVenue, escaped(event.venue)}};
         put(dictionary, kPerformers, event.performers);
         events.emplace_back(std::move(dictionary));
     }

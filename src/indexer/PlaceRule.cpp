@@ -10,12 +10,12 @@
 #include <utility>
 
 #include "core/Calendar.h"
+#include "platform/GeoPoint.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kMetresPerDegree = 111195;
 constexpr std::int64_t kDaysPerWeek = 7;
 constexpr std::int64_t kWorkingDays = 5;
 

@@ -12,13 +12,12 @@
 #include "indexer/GazetteerUpdate.h"
 #include "indexer/OccasionRule.h"
 #include "indexer/PlaceRule.h"
+#include "platform/GeoPoint.h"
 #include "platform/RoutineService.h"
 
 namespace keepsakes {
 
 namespace {
-
-constexpr double kMetresPerDegree = 111195;
 
 /// Beside each visit of the rules, its row and what a file says of it.
 struct VisitWords {
@@ -91,9 +90,9 @@ class NameMap {
     std::vector<NamedPlace> places_;
 };
 
-class Update {
+class PlaceUpdate {
   public:
-    explicit Update(SQLite::Database& database) : database_(database), names_(database) {}
+    explicit PlaceUpdate(SQLite::Database& database) : database_(database), names_(database) {}
 
     void run() {
         forgetDoubtfulVisits();
@@ -286,7 +285,7 @@ class Update {
 bool updatePlaces(IndexWriter& index) {
     if (index.meta(kMetaPlacesStale, 0) == 0) return false;
     index.setMeta(kMetaPlacesStale, 0);
-    Update(index.database()).run();
+    PlaceUpdate(index.database()).run();
     return true;
 }
 

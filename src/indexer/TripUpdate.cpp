@@ -62,8 +62,7 @@ bool updateTrips(IndexWriter& index) {
         put.bind(2, trip.endDate.seconds);
         put.bind(3, trip.title.value_or(""));
         put.bind(4, textOf(trip.tripParts));
-        put.exec();
-        put.reset();
+        runOnce(put);
     }
     return true;
 }

@@ -21,7 +21,7 @@ namespace {
 constexpr double kSafetyMargin = 3600;
 
 /// How long before a visit one may have begun that it is compared with, in seconds.
-constexpr double kLookBack = 7 * kSecondsPerDay;
+constexpr double kLookBack = 7 * kDay;
 
 struct VisitRow {
     KSDateInterval stay;
@@ -65,9 +65,9 @@ std::vector<VisitRow> withoutRepetitions(const std::vector<VisitRow>& visits) {
     return kept;
 }
 
-class Update {
+class VisitUpdate {
   public:
-    Update(IndexWriter& index, KSDate now, const std::function<void()>& alive)
+    VisitUpdate(IndexWriter& index, KSDate now, const std::function<void()>& alive)
         : index_(index), database_(index.database()), now_(now), alive_(alive) {}
 
     bool run() {
@@ -287,7 +287,7 @@ class Update {
 }  // namespace
 
 bool updateVisits(IndexWriter& index, KSDate now, const std::function<void()>& alive) {
-    return Update(index, now, alive).run();
+    return VisitUpdate(index, now, alive).run();
 }
 
 }  // namespace keepsakes

@@ -25,8 +25,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "ActivityTimers";
-
 /// "45 s", "12 min", "2 h 30 min", "3 d": its largest unit and, where that leaves a rest, the next.
 std::string durationText(double seconds) {
     constexpr std::array<std::pair<std::int64_t, std::string_view>, 4> kUnits = {

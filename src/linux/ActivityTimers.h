@@ -4,6 +4,7 @@
 #include <filesystem>
 #include <memory>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "platform/BackgroundActivities.h"
@@ -54,6 +55,8 @@ class ActivityTimers final : public BackgroundActivities {
     void stop() override;
 
   private:
+    static constexpr std::string_view kUnit = "ActivityTimers";
+
     class State;
     const std::shared_ptr<State> state_;
 };

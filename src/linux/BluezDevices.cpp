@@ -20,11 +20,10 @@ namespace keepsakes {
 // Names: org.bluez.Adapter1 and org.bluez.Device1 of BlueZ's D-Bus API.
 namespace {
 
-constexpr const char* kService = "org.bluez";
+constexpr const char* kBluezService = "org.bluez";
 constexpr const char* kAdapterInterface = "org.bluez.Adapter1";
-constexpr const char* kDeviceInterface = "org.bluez.Device1";
+constexpr const char* kBluezDevice = "org.bluez.Device1";
 constexpr const char* kObjectManager = "org.freedesktop.DBus.ObjectManager";
-constexpr double kMicroseconds = 1e6;
 
 std::unexpected<KSError> failure(std::string_view what, int result) {
     return std::unexpected(KSError::make(
@@ -78,7 +77,7 @@ bool readInterfaces(sd_bus_message* message, const char* path, Objects& objects)
         if (sd_bus_message_read_basic(message, 's', static_cast<void*>(&name)) <= 0) return false;
         const std::string_view interface(name);
         bool isRead = true;
-        if (interface == kDeviceInterface) {
+        if (interface == kBluezDevice) {
             isRead = readDevice(message, objects) && sd_bus_message_exit_container(message) >= 0;
         } else if (interface == kAdapterInterface) {
             isRead =
@@ -108,15 +107,15 @@ std::expected<bus::Message, KSError> call(sd_bus* connection, const char* path,
                                           const char* interface, const char* member) {
     sd_bus_message* made = nullptr;
     int result =
-        sd_bus_message_new_method_call(connection, &made, kService, path, interface, member);
+        sd_bus_message_new_method_call(connection, &made, kBluezService, path, interface, member);
     const bus::Message request(made);
     if (result >= 0) result = sd_bus_message_set_auto_start(request.get(), 0);
     if (result < 0) return failure(member, result);
     sd_bus_message* answer = nullptr;
-    result =
-        sd_bus_call(connection, request.get(),
-                    static_cast<std::uint64_t>(BluezDevices::kCallLimitSeconds * kMicroseconds),
-                    nullptr, &answer);
+    result = sd_bus_call(
+        connection, request.get(),
+        static_cast<std::uint64_t>(BluezDevices::kCallLimitSeconds * bus::kMicroseconds), nullptr,
+        &answer);
     if (result < 0) return failure(member, result);
     return bus::Message(answer);
 }

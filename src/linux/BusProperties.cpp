@@ -7,6 +7,8 @@
 #include <cmath>
 #include <utility>
 
+#include "bus/BusHandles.h"
+
 namespace keepsakes::bus {
 
 namespace {
@@ -15,8 +17,6 @@ namespace {
 constexpr std::size_t kMostPaths = 64;
 /// Of one text.
 constexpr std::size_t kLongestText = 1024;
-
-std::string_view view(const char* text) { return text ? text : ""; }
 
 /// A structure of `before` and an object path; 1 when it was read, 0 at the end of an array.
 int readPath(sd_bus_message* message, const std::string& before, std::vector<std::string>& paths) {
@@ -27,7 +27,7 @@ int readPath(sd_bus_message* message, const std::string& before, std::vector<std
     if (sd_bus_message_skip(message, before.c_str()) < 0) return -1;
     if (sd_bus_message_read_basic(message, 'o', static_cast<void*>(&path)) <= 0) return -1;
     if (paths.size() >= kMostPaths) return -1;
-    if (view(path) != "/") paths.emplace_back(path);
+    if (bus::view(path) != "/") paths.emplace_back(path);
     return sd_bus_message_exit_container(message) < 0 ? -1 : 1;
 }
 
@@ -64,7 +64,7 @@ PropertyReader into(std::optional<std::string>& target) {
     return [&target](sd_bus_message* message) {
         const char* read = nullptr;
         if (sd_bus_message_read_basic(message, 's', static_cast<void*>(&read)) <= 0) return false;
-        target = view(read);
+        target = bus::view(read);
         return target->size() <= kLongestText;
     };
 }
@@ -92,7 +92,7 @@ bool readProperties(sd_bus_message* message, const PropertyReaders& readers) {
     while ((entered = sd_bus_message_enter_container(message, 'e', "sv")) > 0) {
         const char* name = nullptr;
         if (sd_bus_message_read_basic(message, 's', static_cast<void*>(&name)) <= 0) return false;
-        const auto reader = readers.find(view(name));
+        const auto reader = readers.find(bus::view(name));
         if (reader == readers.end()) {
             if (sd_bus_message_skip(message, "v") < 0) return false;
         } else if (sd_bus_message_enter_container(message, 'v', nullptr) <= 0 ||
@@ -123,11 +123,11 @@ bool tellsOfChange(sd_bus_message* signal, std::string_view interface,
     if (sd_bus_message_rewind(signal, 1) < 0) return false;
     const char* named = nullptr;
     if (sd_bus_message_read_basic(signal, 's', static_cast<void*>(&named)) <= 0 ||
-        view(named) != interface) {
+        bus::view(named) != interface) {
         return false;
     }
     const auto isWanted = [&properties](const char* name) {
-        return std::ranges::find(properties, view(name)) != properties.end();
+        return std::ranges::find(properties, bus::view(name)) != properties.end();
     };
     const char* name = nullptr;
     if (sd_bus_message_enter_container(signal, 'a', "{sv}") <= 0) return false;
@@ -145,9 +145,11 @@ bool tellsOfChange(sd_bus_message* signal, std::string_view interface,
     return false;
 }
 
-std::string_view pathOf(sd_bus_message* message) { return view(sd_bus_message_get_path(message)); }
+std::string_view pathOf(sd_bus_message* message) {
+    return bus::view(sd_bus_message_get_path(message));
+}
 std::string_view memberOf(sd_bus_message* message) {
-    return view(sd_bus_message_get_member(message));
+    return bus::view(sd_bus_message_get_member(message));
 }
 
 }  // namespace keepsakes::bus

@@ -24,6 +24,7 @@
 #include "bus/BusHandles.h"
 #include "core/Log.h"
 #include "linux/FileWatch.h"
+#include "linux/Guarded.h"
 
 namespace keepsakes {
 
@@ -78,16 +79,6 @@ BusReply replyOf(sd_bus_message* message) {
     const char* sender = sd_bus_message_get_sender(message);
     const bool isFromBus = sender && std::string_view(sender) == "org.freedesktop.DBus";
     return {.outcome = isFromBus ? Outcome::missing : Outcome::refused, .error = name};
-}
-
-/// No exception of ours crosses the C library.
-template <class Work>
-void guarded(const Work& work) {
-    try {
-        work();
-    } catch (const std::exception& exception) {
-        logError(fmt::format("bus: a follower failed: {}", exception.what()));
-    }
 }
 
 }  // namespace
@@ -187,7 +178,7 @@ void BusThread::Loop::connect() {
         return;
     }
     for (const auto& following : followings_) {
-        guarded([&following] { following.follower->becameAvailable(); });
+        guarded("bus: a follower failed", [&following] { following.follower->becameAvailable(); });
     }
 }
 
@@ -232,7 +223,8 @@ void BusThread::Loop::lose(int result) {
     for (auto& following : followings_) {
         following.owner.reset();
         following.signals.reset();
-        guarded([&following] { following.follower->becameUnavailable(); });
+        guarded("bus: a follower failed",
+                [&following] { following.follower->becameUnavailable(); });
     }
     connection_.reset();
     if (!waitsForSocket(result)) tryLater();
@@ -330,7 +322,7 @@ int BusThread::Loop::onOwnerChanged(sd_bus_message* message, void* following, sd
     const char* before = nullptr;
     const char* owner = nullptr;
     if (sd_bus_message_read(message, "sss", &name, &before, &owner) < 0) return 0;
-    guarded([&follower, owner] {
+    guarded("bus: a follower failed", [&follower, owner] {
         if (*owner) {
             follower.becameAvailable();
         } else {
@@ -341,8 +333,9 @@ int BusThread::Loop::onOwnerChanged(sd_bus_message* message, void* following, sd
 }
 
 int BusThread::Loop::onSignal(sd_bus_message* message, void* following, sd_bus_error*) {
-    guarded(
-        [message, following] { static_cast<Following*>(following)->follower->received(message); });
+    guarded("bus: a follower failed", [message, following] {
+        static_cast<Following*>(following)->follower->received(message);
+    });
     return 0;
 }
 
@@ -352,7 +345,7 @@ int BusThread::Loop::onReply(sd_bus_message* message, void* pending, sd_bus_erro
     std::list<PendingCall> answered;
     answered.splice(answered.begin(), call.loop->pending_, call.self);
     const auto reply = replyOf(message);
-    guarded([&call, &reply] { call.handler(reply); });
+    guarded("bus: a follower failed", [&call, &reply] { call.handler(reply); });
     return 0;
 }
 

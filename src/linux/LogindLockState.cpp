@@ -19,9 +19,9 @@ namespace keepsakes {
 // Names: org.freedesktop.login1(5).
 namespace {
 
-constexpr const char* kService = "org.freedesktop.login1";
-constexpr const char* kPath = "/org/freedesktop/login1";
-constexpr const char* kManagerInterface = "org.freedesktop.login1.Manager";
+constexpr const char* kLoginService = "org.freedesktop.login1";
+constexpr const char* kLoginPath = "/org/freedesktop/login1";
+constexpr const char* kLoginManager = "org.freedesktop.login1.Manager";
 constexpr const char* kUserInterface = "org.freedesktop.login1.User";
 constexpr const char* kSessionInterface = "org.freedesktop.login1.Session";
 
@@ -59,7 +59,7 @@ LogindLockState::LogindLockState(BusThread& bus, Owner owner, std::filesystem::p
       memory_(std::move(memory)),
       problems_(problems),
       reader_(
-          bus, kService, [this] { beginReading(); }, [this] { tell(); },
+          bus, kLoginService, [this] { beginReading(); }, [this] { tell(); },
           [this] { becameUnavailable(); }) {
     bus.follow(*this);
     const auto remembered = readFile(memory_, kLongestMemory);
@@ -72,7 +72,7 @@ Observation LogindLockState::observe(const WorkQueue& queue, Task changed) {
     return observers_.add(queue, std::move(changed));
 }
 
-const char* LogindLockState::service() const { return kService; }
+const char* LogindLockState::service() const { return kLoginService; }
 
 void LogindLockState::becameUnavailable() {
     reader_.abandon();
@@ -84,7 +84,7 @@ void LogindLockState::becameUnavailable() {
 void LogindLockState::received(sd_bus_message* signal) {
     const auto path = bus::pathOf(signal);
     const auto isFromManager = [signal](const char* member) {
-        return sd_bus_message_is_signal(signal, kManagerInterface, member) > 0;
+        return sd_bus_message_is_signal(signal, kLoginManager, member) > 0;
     };
     if (isFromManager("SessionNew") || isFromManager("SessionRemoved") ||
         bus::tellsOfChange(signal, kUserInterface, {"Display", "Sessions"})) {
@@ -110,7 +110,7 @@ void LogindLockState::beginReading() {
         return;
     }
     reader_.ask(
-        kPath, kManagerInterface, "GetSession", text(*owner_.session),
+        kLoginPath, kLoginManager, "GetSession", text(*owner_.session),
         [this](sd_bus_message* answer) {
             const char* path = nullptr;
             if (sd_bus_message_read_basic(answer, 'o', static_cast<void*>(&path)) > 0) {
@@ -125,7 +125,7 @@ void LogindLockState::beginReading() {
 
 void LogindLockState::findUser() {
     reader_.ask(
-        kPath, kManagerInterface, "GetUser",
+        kLoginPath, kLoginManager, "GetUser",
         [user = static_cast<std::uint32_t>(owner_.user)](sd_bus_message* message) {
             return sd_bus_message_append_basic(message, 'u', &user);
         },

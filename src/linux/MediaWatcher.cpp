@@ -21,6 +21,7 @@
 
 #include "bus/BusHandles.h"
 #include "core/Log.h"
+#include "linux/Guarded.h"
 #include "linux/PlayerProperties.h"
 
 namespace keepsakes {
@@ -43,9 +44,6 @@ constexpr const char* kPlayerInterface = "org.mpris.MediaPlayer2.Player";
 constexpr std::string_view kNamePrefix = "org.mpris.MediaPlayer2.";
 /// A proxy that repeats what the other players say.
 constexpr std::string_view kProxy = "org.mpris.MediaPlayer2.playerctld";
-constexpr double kMicroseconds = 1e6;
-
-std::string_view view(const char* text) { return text ? text : ""; }
 
 KSError busError(std::string_view what, int result) {
     return KSError::make(
@@ -127,29 +125,16 @@ class MediaWatcher::Loop {
     bool full_ = false;  ///< There are players that are not listened to.
 };
 
-namespace {
-
-/// Nothing thrown passes through the bus library.
-template <class Work>
-int guarded(const Work& work) {
-    try {
-        work();
-    } catch (const std::exception& exception) {
-        logError(fmt::format("media: {}", exception.what()));
-    }
-    return 0;
-}
-
-}  // namespace
+namespace {}  // namespace
 
 template <void (MediaWatcher::Loop::*Method)(sd_bus_message*)>
 int MediaWatcher::Loop::handler(sd_bus_message* message, void* loop, sd_bus_error*) {
-    return guarded([&] { (static_cast<Loop*>(loop)->*Method)(message); });
+    return guarded("media", [&] { (static_cast<Loop*>(loop)->*Method)(message); });
 }
 
 template <void (*Method)(MediaWatcher::Loop::Player&, sd_bus_message*)>
 int MediaWatcher::Loop::playerHandler(sd_bus_message* message, void* player, sd_bus_error*) {
-    return guarded([&] { Method(*static_cast<Player*>(player), message); });
+    return guarded("media", [&] { Method(*static_cast<Player*>(player), message); });
 }
 
 OptionalError MediaWatcher::Loop::start() {
@@ -230,7 +215,7 @@ void MediaWatcher::Loop::onNames(sd_bus_message* message) {
     if (sd_bus_message_enter_container(message, 'a', "s") <= 0) return;
     const char* name = nullptr;
     while (sd_bus_message_read_basic(message, 's', static_cast<void*>(&name)) > 0) {
-        if (!view(name).starts_with(kNamePrefix)) continue;
+        if (!bus::view(name).starts_with(kNamePrefix)) continue;
         if (ownerCalls_.size() >= kMostPlayers) {
             full_ = true;
             return;
@@ -263,9 +248,9 @@ void MediaWatcher::Loop::onOwnerChanged(sd_bus_message* message) {
     const char* before = nullptr;
     const char* after = nullptr;
     if (sd_bus_message_read(message, "sss", &name, &before, &after) <= 0) return;
-    if (!view(name).starts_with(kNamePrefix)) return;
-    if (!view(before).empty()) removeName(name, before);
-    if (!view(after).empty()) addName(name, after);
+    if (!bus::view(name).starts_with(kNamePrefix)) return;
+    if (!bus::view(before).empty()) removeName(name, before);
+    if (!bus::view(after).empty()) addName(name, after);
 }
 
 void MediaWatcher::Loop::addName(const std::string& name, const std::string& owner) {
@@ -364,7 +349,7 @@ void MediaWatcher::Loop::onPropertiesChanged(Player& player, sd_bus_message* mes
     if (player.asking || sd_bus_message_enter_container(message, 'a', "s") <= 0) return;
     const char* property = nullptr;
     while (sd_bus_message_read_basic(message, 's', static_cast<void*>(&property)) > 0) {
-        if (view(property) != "Metadata" && view(property) != "PlaybackStatus") continue;
+        if (bus::view(property) != "Metadata" && bus::view(property) != "PlaybackStatus") continue;
         loop.askState(player);
         return;
     }
@@ -375,7 +360,7 @@ void MediaWatcher::Loop::onSeeked(Player& player, sd_bus_message* message) {
     if (!loop.countSignal(player) || !player.ready) return;
     std::int64_t position = 0;
     if (sd_bus_message_read_basic(message, 'x', &position) <= 0) return;
-    loop.tracker_.jumped(player.connection, static_cast<double>(position) / kMicroseconds,
+    loop.tracker_.jumped(player.connection, static_cast<double>(position) / bus::kMicroseconds,
                          loop.now_());
 }
 
@@ -406,10 +391,10 @@ void MediaWatcher::Loop::turnDeaf(Player& player) {
     sd_event_source* timer = nullptr;
     sd_event_add_time_relative(
         event_.get(), &timer, CLOCK_MONOTONIC,
-        static_cast<std::uint64_t>(kDeafSeconds * kMicroseconds), 0,
+        static_cast<std::uint64_t>(kDeafSeconds * bus::kMicroseconds), 0,
         [](sd_event_source*, std::uint64_t, void* data) {
             auto& heard = *static_cast<Player*>(data);
-            return guarded([&heard] { heard.loop->listenTo(heard); });
+            return guarded("media", [&heard] { heard.loop->listenTo(heard); });
         },
         &player);
     player.deaf.reset(timer);

@@ -8,18 +8,17 @@
 #include <cstdint>
 #include <optional>
 
+#include "bus/BusHandles.h"
+
 namespace keepsakes {
 
 namespace {
 
 constexpr std::string_view kNoTrack = "/org/mpris/MediaPlayer2/TrackList/NoTrack";
-constexpr double kMicroseconds = 1e6;
 /// Longer than any recording; live streams say that they last for ever.
 constexpr double kLongestItem = 100 * 3600.0;
 /// Entries of a list, such as artists, beyond these are not read.
 constexpr int kMostInList = 16;
-
-std::string_view view(const char* text) { return text ? text : ""; }
 
 /// The signature of what comes next, which is entered when it is a variant; empty at the end.
 class Variant {
@@ -29,7 +28,7 @@ class Variant {
         const char* contents = nullptr;
         if (sd_bus_message_peek_type(message, &type, &contents) <= 0 || type != 'v') return;
         entered_ = sd_bus_message_enter_container(message, 'v', contents) > 0;
-        if (entered_) signature_ = view(contents);
+        if (entered_) signature_ = bus::view(contents);
     }
     ~Variant() {
         if (entered_) leave();
@@ -56,7 +55,7 @@ class Variant {
 
 std::string_view basicText(sd_bus_message* message, char type) {
     const char* text = nullptr;
-    return sd_bus_message_read_basic(message, type, static_cast<void*>(&text)) > 0 ? view(text)
+    return sd_bus_message_read_basic(message, type, static_cast<void*>(&text)) > 0 ? bus::view(text)
                                                                                    : "";
 }
 
@@ -103,7 +102,7 @@ std::optional<double> readLength(sd_bus_message* message) {
     const auto& signature = variant.signature();
     const auto length = signature.size() == 1 ? number(message, signature[0]) : std::nullopt;
     if (!length || !std::isfinite(*length)) return std::nullopt;
-    const double seconds = *length / kMicroseconds;
+    const double seconds = *length / bus::kMicroseconds;
     return seconds >= 1 && seconds <= kLongestItem ? std::optional(seconds) : std::nullopt;
 }
 

@@ -17,10 +17,10 @@ namespace keepsakes {
 // Names and numbers: UPower Reference Manual, org.freedesktop.UPower and .Device.
 namespace {
 
-constexpr const char* kService = "org.freedesktop.UPower";
-constexpr const char* kPath = "/org/freedesktop/UPower";
-constexpr const char* kManagerInterface = "org.freedesktop.UPower";
-constexpr const char* kDeviceInterface = "org.freedesktop.UPower.Device";
+constexpr const char* kPowerService = "org.freedesktop.UPower";
+constexpr const char* kPowerPath = "/org/freedesktop/UPower";
+constexpr const char* kPowerInterface = "org.freedesktop.UPower";
+constexpr const char* kPowerDevice = "org.freedesktop.UPower.Device";
 
 enum Type : std::uint32_t { kLinePower = 1, kBattery = 2, kUps = 3 };
 constexpr std::uint32_t kFullyCharged = 4;
@@ -165,7 +165,7 @@ PowerSourceProperties UPowerSources::Snapshot::properties() const {
 
 UPowerSources::UPowerSources(BusThread& bus)
     : reader_(
-          bus, kService, [this] { beginReading(); }, [this] { tell(); },
+          bus, kPowerService, [this] { beginReading(); }, [this] { tell(); },
           [this] { becameUnavailable(); }),
       snapshot_(std::make_unique<Snapshot>()) {
     bus.follow(*this);
@@ -184,7 +184,7 @@ Observation UPowerSources::observeExternalPower(const WorkQueue& queue, Task cha
     return externalChanged_.add(queue, std::move(changed));
 }
 
-const char* UPowerSources::service() const { return kService; }
+const char* UPowerSources::service() const { return kPowerService; }
 
 void UPowerSources::becameUnavailable() {
     reader_.abandon();
@@ -193,11 +193,11 @@ void UPowerSources::becameUnavailable() {
 
 void UPowerSources::received(sd_bus_message* signal) {
     const bool matters =
-        sd_bus_message_is_signal(signal, kManagerInterface, "DeviceAdded") > 0 ||
-        sd_bus_message_is_signal(signal, kManagerInterface, "DeviceRemoved") > 0 ||
-        (bus::pathOf(signal) == kPath &&
-         bus::tellsOfChange(signal, kManagerInterface, {"OnBattery"})) ||
-        bus::tellsOfChange(signal, kDeviceInterface,
+        sd_bus_message_is_signal(signal, kPowerInterface, "DeviceAdded") > 0 ||
+        sd_bus_message_is_signal(signal, kPowerInterface, "DeviceRemoved") > 0 ||
+        (bus::pathOf(signal) == kPowerPath &&
+         bus::tellsOfChange(signal, kPowerInterface, {"OnBattery"})) ||
+        bus::tellsOfChange(signal, kPowerDevice,
                            {"Type", "State", "PowerSupply", "IsPresent", "Online", "Energy",
                             "EnergyFull", "Percentage", "NativePath", "Model"});
     if (matters) reader_.read();
@@ -205,12 +205,12 @@ void UPowerSources::received(sd_bus_message* signal) {
 
 void UPowerSources::beginReading() {
     *snapshot_ = {};
-    reader_.askProperties(kPath, kManagerInterface, [this](sd_bus_message* answer) {
+    reader_.askProperties(kPowerPath, kPowerInterface, [this](sd_bus_message* answer) {
         if (!bus::readProperties(answer, {{"OnBattery", bus::into(snapshot_->onBattery)}})) {
             reader_.fail("properties that make no sense");
         }
     });
-    reader_.ask(kPath, kManagerInterface, "EnumerateDevices", nullptr,
+    reader_.ask(kPowerPath, kPowerInterface, "EnumerateDevices", nullptr,
                 [this](sd_bus_message* list) { readDevices(list); });
 }
 
@@ -223,7 +223,7 @@ void UPowerSources::readDevices(sd_bus_message* list) {
     for (const auto& path : *paths) {
         auto& device = snapshot_->devices.emplace_back(Device{.path = path});
         reader_.askProperties(
-            path, kDeviceInterface,
+            path, kPowerDevice,
             [this, &device](sd_bus_message* answer) {
                 if (!device.read(answer)) reader_.fail(device.path + " makes no sense");
             },

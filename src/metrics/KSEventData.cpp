@@ -7,13 +7,13 @@
 #include <string_view>
 #include <vector>
 
+#include "core/KSDate.h"
 #include "metrics/MetricValues.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kHour = 3600;
 constexpr const char* kNumber = "numberOfEvents";
 constexpr const char* kFrom = "eventsFrom";
 constexpr const char* kLatency = "latency";

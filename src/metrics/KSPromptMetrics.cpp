@@ -8,13 +8,13 @@
 #include <unordered_set>
 #include <utility>
 
+#include "core/KSDate.h"
 #include "metrics/MetricValues.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kHour = 3600;
 constexpr const char* kWindowLength = "windowLength";
 constexpr const char* kEvents = "numberOfEvents";
 constexpr const char* kClusters = "numberOfClusters";

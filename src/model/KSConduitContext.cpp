@@ -10,7 +10,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSConduitContext";
 constexpr std::string_view kProcessName = "ProcessName";
 
 }  // namespace

@@ -3,6 +3,7 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 
 #include "core/KSValue.h"
 #include "model/KeyedCoding.h"
@@ -28,6 +29,8 @@ class KSConduitContext final {
     static KSValue decodeToDictionary(const KSValue& data);
 
   private:
+    static constexpr std::string_view kUnit = "KSConduitContext";
+
     KSDictionary configuration_;
 };
 

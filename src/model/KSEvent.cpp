@@ -13,7 +13,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSEvent";
 constexpr std::size_t kMostDescribedInteractions = 10;
 
 constexpr std::array<std::string_view, 6> kProviderNames = {
@@ -54,8 +53,6 @@ std::string nameOrUnknown(std::uint64_t value, const std::array<std::string_view
     if (value < N && !names[value].empty()) return std::string(names[value]);
     return fmt::format("Unknown ({})", value);
 }
-
-std::string describeDate(std::optional<KSDate> date) { return describe(KSEvent::FormatDate(date)); }
 
 }  // namespace
 
@@ -169,7 +166,7 @@ std::string KSEvent::describeDetails() const {
                 "{}, itemRecipientAddresses, {}, itemDisplayName, {}, itemLinkTitle, {}, "
                 "itemLinkDescription, {}, itemIsShared, {}, itemSyndicationStatus, {}",
                 describe(itemUniqueIdentifier), describe(itemURL),
-                describeDate(itemContentCreationDate), describe(itemAuthorAddresses),
+                describe(FormatDate(itemContentCreationDate)), describe(itemAuthorAddresses),
                 describe(itemAuthorContactIdentifiers), describe(itemAccountHandles),
                 describe(itemRecipientAddresses), describe(itemDisplayName),
                 describe(itemLinkTitle), describe(itemLinkDescription), itemIsShared ? "YES" : "NO",
@@ -204,9 +201,11 @@ std::string KSEvent::description() const {
         "<KSEvent eventIdentifier, {}, identifierFromProvider, {}, startDate, {}, endDate, {}, "
         "creationDate, {}, sourceCreationDate, {}, expirationDate, {}, provider, {}, category, "
         "{}, {}>",
-        eventIdentifier_.string(), describe(identifierFromProvider), describeDate(startDate_),
-        describeDate(endDate_), describeDate(creationDate_), describeDate(sourceCreationDate()),
-        describeDate(expirationDate), describeProvider(), describeCategory(), describeDetails());
+        eventIdentifier_.string(), describe(identifierFromProvider),
+        describe(FormatDate(startDate_)), describe(FormatDate(endDate_)),
+        describe(FormatDate(creationDate_)), describe(FormatDate(sourceCreationDate())),
+        describe(FormatDate(expirationDate)), describeProvider(), describeCategory(),
+        describeDetails());
 }
 
 }  // namespace keepsakes

@@ -173,6 +173,8 @@ class KSEvent final {
     std::optional<KSDictionary> trends;
 
   private:
+    static constexpr std::string_view kUnit = "KSEvent";
+
     KSEvent(const KSUUID& eventIdentifier, KSDate startDate, KSDate endDate, KSDate creationDate,
             KSEventProvider provider, KSEventCategory category);
     KSEvent(const KSEvent&) = default;

@@ -15,8 +15,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSEventBundle";
-
 using Bundle = KSEventBundle;
 
 void writeEvents(KeyedEncoder& out, std::string_view key, const Bundle& bundle) {
@@ -36,7 +34,7 @@ bool readEvents(KeyedDecoder& in, Bundle& bundle) {
 }
 
 /// In the archive's order, behind the identifier and the creation date.
-constexpr auto kFields = std::to_array<KeyedField<Bundle>>({
+constexpr auto kBundleFields = std::to_array<KeyedField<Bundle>>({
     coding::field<&Bundle::startDate>("startDate"),
     coding::field<&Bundle::endDate>("endDate"),
     coding::field<&Bundle::expirationDate>("expirationDate"),
@@ -45,8 +43,6 @@ constexpr auto kFields = std::to_array<KeyedField<Bundle>>({
     coding::field<&Bundle::filtered>("filtered"),
     coding::field<&Bundle::promptLanguage>("promptLanguage"),
 });
-
-std::string describeDate(std::optional<KSDate> date) { return describe(KSEvent::FormatDate(date)); }
 
 }  // namespace
 
@@ -101,19 +97,20 @@ std::string KSEventBundle::description() const {
     return fmt::format(
         "<KSEventBundle bundleIdentifier, {}, startDate, {}, endDate, {}, creationDate, {}, "
         "source, {}, expirationDate, {}, filtered, {}, promptLanguage, {} , events, {},>",
-        bundleIdentifier_.string(), describeDate(startDate), describeDate(endDate),
-        describeDate(creationDate_), source, describeDate(expirationDate), filtered ? "Yes" : "No",
+        bundleIdentifier_.string(), describe(KSEvent::FormatDate(startDate)),
+        describe(KSEvent::FormatDate(endDate)), describe(KSEvent::FormatDate(creationDate_)),
+        source, describe(KSEvent::FormatDate(expirationDate)), filtered ? "Yes" : "No",
         describe(promptLanguage), describe(events));
 }
 
 void KSEventBundle::encodeWithCoder(KeyedEncoder& encoder) const {
     encoder.writeUUID("bundleIdentifier", bundleIdentifier_);
     encoder.writeDate("creationDate", creationDate_);
-    encodeFields<Bundle>(encoder, *this, kFields);
+    encodeFields<Bundle>(encoder, *this, kBundleFields);
 }
 
 std::shared_ptr<KSEventBundle> KSEventBundle::initWithCoder(KeyedDecoder& decoder) {
-    static const KeyedFieldIndex<Bundle> index{std::span<const KeyedField<Bundle>>(kFields)};
+    static const KeyedFieldIndex<Bundle> index{std::span<const KeyedField<Bundle>>(kBundleFields)};
     std::optional<KSUUID> identifier;
     std::optional<KSDate> created;
     std::shared_ptr<KSEventBundle> bundle(new KSEventBundle({}, {}));

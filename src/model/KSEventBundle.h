@@ -5,6 +5,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 
 #include "model/KSEvent.h"
 
@@ -58,6 +59,8 @@ class KSEventBundle final {
     KSEventArray events;
 
   private:
+    static constexpr std::string_view kUnit = "KSEventBundle";
+
     KSEventBundle(const KSUUID& bundleIdentifier, KSDate creationDate)
         : bundleIdentifier_(bundleIdentifier), creationDate_(creationDate) {}
 

@@ -9,17 +9,17 @@ namespace keepsakes {
 
 namespace {
 
-using Options = KSEventBundleFetchOptions;
-
-constexpr auto kFields = std::to_array<KeyedField<Options>>({
-    coding::field<&Options::ascending>("ascending"),
-    coding::field<&Options::dateInterval>("dateInterval"),
+constexpr auto kBundleOptionFields = std::to_array<KeyedField<KSEventBundleFetchOptions>>({
+    coding::field<&KSEventBundleFetchOptions::ascending>("ascending"),
+    coding::field<&KSEventBundleFetchOptions::dateInterval>("dateInterval"),
     {"limit",
-     [](KeyedEncoder& out, std::string_view key, const Options& options) {
+     [](KeyedEncoder& out, std::string_view key, const KSEventBundleFetchOptions& options) {
          coding::write(out, key, options.limit);
      },
-     [](KeyedDecoder& in, Options& options) { return readLimit(in, options.limit); }},
-    coding::field<&Options::filterBundle>("filterBundle"),
+     [](KeyedDecoder& in, KSEventBundleFetchOptions& options) {
+         return readLimit(in, options.limit);
+     }},
+    coding::field<&KSEventBundleFetchOptions::filterBundle>("filterBundle"),
 });
 
 }  // namespace
@@ -36,12 +36,13 @@ std::string KSEventBundleFetchOptions::description() const {
 }
 
 void KSEventBundleFetchOptions::encodeWithCoder(KeyedEncoder& encoder) const {
-    encodeFields<Options>(encoder, *this, kFields);
+    encodeFields<KSEventBundleFetchOptions>(encoder, *this, kBundleOptionFields);
 }
 
 bool KSEventBundleFetchOptions::initWithCoder(KeyedDecoder& decoder,
                                               KSEventBundleFetchOptions& options) {
-    static const KeyedFieldIndex<Options> index{std::span<const KeyedField<Options>>(kFields)};
+    static const KeyedFieldIndex<KSEventBundleFetchOptions> index{
+        std::span<const KeyedField<KSEventBundleFetchOptions>>(kBundleOptionFields)};
     return decoder.readRecord([&options](std::string_view key, KeyedDecoder& in) {
         return index.read(key, in, options);
     });

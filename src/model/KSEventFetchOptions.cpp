@@ -9,21 +9,19 @@ namespace keepsakes {
 
 namespace {
 
-using Options = KSEventFetchOptions;
-
-constexpr auto kFields = std::to_array<KeyedField<Options>>({
-    coding::field<&Options::ascending>("ascending"),
-    coding::field<&Options::dateInterval>("dateInterval"),
+constexpr auto kEventOptionFields = std::to_array<KeyedField<KSEventFetchOptions>>({
+    coding::field<&KSEventFetchOptions::ascending>("ascending"),
+    coding::field<&KSEventFetchOptions::dateInterval>("dateInterval"),
     {"limit",
-     [](KeyedEncoder& out, std::string_view key, const Options& options) {
+     [](KeyedEncoder& out, std::string_view key, const KSEventFetchOptions& options) {
          coding::write(out, key, options.limit);
      },
-     [](KeyedDecoder& in, Options& options) { return readLimit(in, options.limit); }},
+     [](KeyedDecoder& in, KSEventFetchOptions& options) { return readLimit(in, options.limit); }},
     {"category",
-     [](KeyedEncoder& out, std::string_view key, const Options& options) {
+     [](KeyedEncoder& out, std::string_view key, const KSEventFetchOptions& options) {
          out.writeUnsigned(key, static_cast<std::uint64_t>(options.category));
      },
-     [](KeyedDecoder& in, Options& options) {
+     [](KeyedDecoder& in, KSEventFetchOptions& options) {
          std::uint64_t category = 0;
          if (!in.readUnsigned(category)) return false;
          options.category = static_cast<KSEventCategory>(category);
@@ -45,11 +43,12 @@ std::string KSEventFetchOptions::description() const {
 }
 
 void KSEventFetchOptions::encodeWithCoder(KeyedEncoder& encoder) const {
-    encodeFields<Options>(encoder, *this, kFields);
+    encodeFields<KSEventFetchOptions>(encoder, *this, kEventOptionFields);
 }
 
 bool KSEventFetchOptions::initWithCoder(KeyedDecoder& decoder, KSEventFetchOptions& options) {
-    static const KeyedFieldIndex<Options> index{std::span<const KeyedField<Options>>(kFields)};
+    static const KeyedFieldIndex<KSEventFetchOptions> index{
+        std::span<const KeyedField<KSEventFetchOptions>>(kEventOptionFields)};
     return decoder.readRecord([&options](std::string_view key, KeyedDecoder& in) {
         return index.read(key, in, options);
     });

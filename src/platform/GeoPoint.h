@@ -13,4 +13,7 @@ struct GeoPoint {
 /// Great-circle distance in metres on a sphere of the mean earth radius (haversine formula).
 double distanceBetween(const GeoPoint& a, const GeoPoint& b);
 
+/// Of latitude, on the same sphere.
+inline constexpr double kMetresPerDegree = 111195;
+
 }  // namespace keepsakes

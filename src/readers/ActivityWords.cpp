@@ -12,12 +12,12 @@ namespace keepsakes {
 
 namespace {
 
-struct Row {
+struct ActivityRow {
     std::string_view activity;  ///< A name of the catalogue.
     std::string_view words;     ///< Folded words, apart by blanks.
 };
 
-constexpr auto kRows = std::to_array<Row>({
+constexpr auto kActivityRows = std::to_array<ActivityRow>({
     {"Alpine Skiing",
      "2 ski skiing alpineski downhillskiing downhillski resortskiing resortskiingsnowboarding "
      "resortskiingsnowboardingws skifahren"},
@@ -101,10 +101,10 @@ constexpr std::string_view kTransport =
     "zug bahn voiture coche macchina treno tren trein avion stationary offroad4x4 atv snowmobile "
     "motorsports motorsport";
 
-using Table = std::unordered_map<std::string, ActivityWord>;
+using ActivityTable = std::unordered_map<std::string, ActivityWord>;
 
-Table makeTable() {
-    Table table;
+ActivityTable makeTable() {
+    ActivityTable table;
     for (auto& word : foldedWords(kTransport)) {
         table[std::move(word)] = {ActivityWord::Meaning::transport, 0};
     }
@@ -114,7 +114,7 @@ Table makeTable() {
         table.try_emplace(foldWord(activity.name),
                           ActivityWord{ActivityWord::Meaning::activity, activity.code});
     }
-    for (const auto& row : kRows) {
+    for (const auto& row : kActivityRows) {
         const ActivityWord meaning{ActivityWord::Meaning::activity,
                                    activityCode(row.activity).value()};
         for (auto& word : foldedWords(row.words)) table.try_emplace(std::move(word), meaning);
@@ -126,7 +126,7 @@ Table makeTable() {
 }  // namespace
 
 ActivityWord activityOfWord(std::string_view type) {
-    static const Table table = makeTable();
+    static const ActivityTable table = makeTable();
     const auto found = table.find(foldWord(type));
     return found == table.end() ? ActivityWord{} : found->second;
 }

@@ -5,6 +5,7 @@
 #include <optional>
 #include <utility>
 
+#include "core/Text.h"
 #include "readers/ReaderLimits.h"
 #include "readers/TextFolding.h"
 
@@ -30,21 +31,15 @@ std::size_t findUnquoted(std::string_view text, std::string_view wanted) {
     return std::string_view::npos;
 }
 
-std::optional<int> hexDigit(char c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (raised(c) >= 'A' && raised(c) <= 'F') return raised(c) - 'A' + 10;
-    return std::nullopt;
-}
-
 /// RFC 2045, 6.7; what is no escape stands for itself.
 std::string decodeQuotedPrintable(std::string_view text) {
     std::string bytes;
     for (std::size_t i = 0; i < text.size(); ++i) {
         if (text[i] == '=' && i + 2 < text.size()) {
-            const auto high = hexDigit(text[i + 1]);
-            const auto low = hexDigit(text[i + 2]);
-            if (high && low) {
-                bytes += static_cast<char>(*high * 16 + *low);
+            const int high = hexDigit(text[i + 1]);
+            const int low = hexDigit(text[i + 2]);
+            if (high >= 0 && low >= 0) {
+                bytes += static_cast<char>(high * 16 + low);
                 i += 2;
                 continue;
             }

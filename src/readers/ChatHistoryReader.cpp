@@ -22,7 +22,7 @@ namespace {
 
 using Mechanism = InteractionMechanism;
 
-constexpr std::uint32_t kIdentitySeed = 0x63686174;
+constexpr std::uint32_t kChatIdentitySeed = 0x63686174;
 constexpr int kBusyMilliseconds = 2000;
 /// So many pages are copied at a time; in between the messenger may write.
 constexpr int kPagesPerStep = 256;
@@ -183,7 +183,7 @@ class History {
         record.recipients.erase(first, last);
         record.identity = murmurHash3(
             fmt::format("{}\n{}\n{}", row.getColumn(0).getString(), thread, date.seconds),
-            kIdentitySeed);
+            kChatIdentitySeed);
         sink_.interaction(record);
         links(row, isGroup ? thread : "");
     }

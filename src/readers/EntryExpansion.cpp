@@ -7,13 +7,12 @@
 #include <cmath>
 #include <utility>
 
+#include "core/KSDate.h"
 #include "readers/ReaderLimits.h"
 
 namespace keepsakes {
 
 namespace {
-
-constexpr double kDay = 86400;
 
 /// "20240615", or "20240615T080000Z" of an instant.
 std::string stampOf(KSDate time, bool isDate) {

@@ -8,14 +8,14 @@ namespace keepsakes {
 
 namespace {
 
-struct Row {
+struct SportRow {
     std::int64_t number;
     std::string_view word;
 };
 
 // Profile of the FIT SDK, types "sub_sport" and "sport". Sub-sports that do not change what the
 // activity is (road, commuting, lap swimming, ...) are left to their sport.
-constexpr auto kSubSports = std::to_array<Row>({
+constexpr auto kSubSports = std::to_array<SportRow>({
     {1, "running"},          // treadmill
     {3, "trail running"},    // trail
     {5, "stationary bike"},  // spin
@@ -58,7 +58,7 @@ constexpr auto kSubSports = std::to_array<Row>({
     {97, "table tennis"},
 });
 
-constexpr auto kSports = std::to_array<Row>({
+constexpr auto kSports = std::to_array<SportRow>({
     {1, "running"},
     {2, "cycling"},
     {5, "swimming"},
@@ -119,7 +119,7 @@ constexpr std::int64_t kBackcountry = 37;
 
 std::string_view wordOf(const auto& rows, std::optional<std::int64_t> number) {
     const auto* const row =
-        std::ranges::find_if(rows, [&](const Row& one) { return number == one.number; });
+        std::ranges::find_if(rows, [&](const SportRow& one) { return number == one.number; });
     return row == rows.end() ? std::string_view() : row->word;
 }
 

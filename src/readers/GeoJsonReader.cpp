@@ -20,7 +20,7 @@ namespace keepsakes {
 
 namespace {
 
-enum class Place : std::uint8_t {
+enum class GeoJsonPlace : std::uint8_t {
     document,  ///< The top object, which may be a feature or a geometry itself.
     ignored,
     feature,
@@ -39,32 +39,32 @@ enum class Place : std::uint8_t {
 
 // RFC 7946 fixes the members of features and geometries. Properties are free; these are the names
 // that recording apps and map sites use.
-constexpr auto kSteps = std::to_array<JsonStep<Place>>({
-    {Place::document, "features", Place::feature},
-    {Place::document, "geometry", Place::geometry},
-    {Place::document, "properties", Place::properties},
-    {Place::document, "type", Place::geometryType},
-    {Place::document, "coordinates", Place::coordinates},
-    {Place::feature, "geometry", Place::geometry},
-    {Place::feature, "properties", Place::properties},
-    {Place::geometry, "type", Place::geometryType},
-    {Place::geometry, "coordinates", Place::coordinates},
-    {Place::properties, "time", Place::time},
-    {Place::properties, "timestamp", Place::time},
-    {Place::properties, "tst", Place::time},
-    {Place::properties, "coordTimes", Place::times},
-    {Place::properties, "times", Place::times},
-    {Place::properties, "coordinateProperties", Place::coordinateProperties},
-    {Place::coordinateProperties, "times", Place::times},
-    {Place::properties, "accuracy", Place::accuracy},
-    {Place::properties, "horizontal_accuracy", Place::accuracy},
-    {Place::properties, "name", Place::name},
-    {Place::properties, "Name", Place::name},
-    {Place::properties, "title", Place::name},
-    {Place::properties, "Title", Place::name},
-    {Place::properties, "use", Place::use},
-    {Place::properties, "location", Place::location},
-    {Place::location, "name", Place::name},
+constexpr auto kGeoJsonSteps = std::to_array<JsonStep<GeoJsonPlace>>({
+    {GeoJsonPlace::document, "features", GeoJsonPlace::feature},
+    {GeoJsonPlace::document, "geometry", GeoJsonPlace::geometry},
+    {GeoJsonPlace::document, "properties", GeoJsonPlace::properties},
+    {GeoJsonPlace::document, "type", GeoJsonPlace::geometryType},
+    {GeoJsonPlace::document, "coordinates", GeoJsonPlace::coordinates},
+    {GeoJsonPlace::feature, "geometry", GeoJsonPlace::geometry},
+    {GeoJsonPlace::feature, "properties", GeoJsonPlace::properties},
+    {GeoJsonPlace::geometry, "type", GeoJsonPlace::geometryType},
+    {GeoJsonPlace::geometry, "coordinates", GeoJsonPlace::coordinates},
+    {GeoJsonPlace::properties, "time", GeoJsonPlace::time},
+    {GeoJsonPlace::properties, "timestamp", GeoJsonPlace::time},
+    {GeoJsonPlace::properties, "tst", GeoJsonPlace::time},
+    {GeoJsonPlace::properties, "coordTimes", GeoJsonPlace::times},
+    {GeoJsonPlace::properties, "times", GeoJsonPlace::times},
+    {GeoJsonPlace::properties, "coordinateProperties", GeoJsonPlace::coordinateProperties},
+    {GeoJsonPlace::coordinateProperties, "times", GeoJsonPlace::times},
+    {GeoJsonPlace::properties, "accuracy", GeoJsonPlace::accuracy},
+    {GeoJsonPlace::properties, "horizontal_accuracy", GeoJsonPlace::accuracy},
+    {GeoJsonPlace::properties, "name", GeoJsonPlace::name},
+    {GeoJsonPlace::properties, "Name", GeoJsonPlace::name},
+    {GeoJsonPlace::properties, "title", GeoJsonPlace::name},
+    {GeoJsonPlace::properties, "Title", GeoJsonPlace::name},
+    {GeoJsonPlace::properties, "use", GeoJsonPlace::use},
+    {GeoJsonPlace::properties, "location", GeoJsonPlace::location},
+    {GeoJsonPlace::location, "name", GeoJsonPlace::name},
 });
 
 struct Feature {
@@ -79,7 +79,7 @@ struct Feature {
     std::string use;
 };
 
-class GeoJson final : public JsonPlaces<Place> {
+class GeoJson final : public JsonPlaces<GeoJsonPlace> {
   public:
     GeoJson(const ReaderContext& context, LocationSink& places)
         : times_(context.now), places_(places) {}
@@ -94,26 +94,26 @@ class GeoJson final : public JsonPlaces<Place> {
     }
 
   protected:
-    Place placeOf(Place parent, std::string_view name) const override {
-        return stepFrom<Place>(parent, name, kSteps);
+    GeoJsonPlace placeOf(GeoJsonPlace parent, std::string_view name) const override {
+        return stepFrom<GeoJsonPlace>(parent, name, kGeoJsonSteps);
     }
 
-    void enter(Place place) override {
-        if (place == Place::feature || place == Place::document) feature_ = {};
+    void enter(GeoJsonPlace place) override {
+        if (place == GeoJsonPlace::feature || place == GeoJsonPlace::document) feature_ = {};
     }
 
-    void leave(Place place) override {
-        if (place == Place::feature || place == Place::document) tell();
-        if (place == Place::feature) feature_ = {};
+    void leave(GeoJsonPlace place) override {
+        if (place == GeoJsonPlace::feature || place == GeoJsonPlace::document) tell();
+        if (place == GeoJsonPlace::feature) feature_ = {};
     }
 
-    void enterArray(Place place) override {
-        if (place == Place::coordinates) position_.clear();
+    void enterArray(GeoJsonPlace place) override {
+        if (place == GeoJsonPlace::coordinates) position_.clear();
     }
 
     /// The innermost arrays are the positions, at any depth.
-    void leaveArray(Place place) override {
-        if (place != Place::coordinates || position_.empty()) return;
+    void leaveArray(GeoJsonPlace place) override {
+        if (place != GeoJsonPlace::coordinates || position_.empty()) return;
         if (hasRoom(feature_.positions)) {
             feature_.positions.push_back(
                 position_.size() < 2 ? std::nullopt : geoPoint(position_[1], position_[0]));
@@ -121,32 +121,32 @@ class GeoJson final : public JsonPlaces<Place> {
         position_.clear();
     }
 
-    void take(Place place, const JsonScalar& value) override {
+    void take(GeoJsonPlace place, const JsonScalar& value) override {
         switch (place) {
-            case Place::geometryType:
+            case GeoJsonPlace::geometryType:
                 feature_.isPoint = value.text == "Point";
                 feature_.isLine = value.text == "LineString" || value.text == "MultiLineString" ||
                                   value.text == "MultiPoint";
                 break;
-            case Place::coordinates:
+            case GeoJsonPlace::coordinates:
                 // Longitude, latitude, and an altitude that is not needed.
                 if (position_.size() < 2) position_.push_back(value.number);
                 break;
-            case Place::time:
+            case GeoJsonPlace::time:
                 if (!value.text && !value.number) break;
                 feature_.hasTime = true;
                 feature_.time = timeAt(value);
                 break;
-            case Place::times:
+            case GeoJsonPlace::times:
                 if (hasRoom(feature_.times)) feature_.times.push_back(timeAt(value));
                 break;
-            case Place::accuracy:
+            case GeoJsonPlace::accuracy:
                 feature_.accuracyMeters = accuracyOf(value);
                 break;
-            case Place::name:
+            case GeoJsonPlace::name:
                 if (feature_.name.empty()) feature_.name = nameOf(value);
                 break;
-            case Place::use:
+            case GeoJsonPlace::use:
                 feature_.use = nameOf(value);
                 break;
             default:

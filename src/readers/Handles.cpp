@@ -17,22 +17,11 @@ constexpr std::size_t kShortestCode = 3;
 /// RFC 5321, 4.5.3.1.3: a path of 256 octets with its brackets.
 constexpr std::size_t kLongestAddress = 254;
 
-bool isDigit(char c) { return c >= '0' && c <= '9'; }
-
-char lowered(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; }
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kBlank = " \t\r\n";
-    const auto first = text.find_first_not_of(kBlank);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kBlank) - first + 1);
-}
-
 /// Takes the scheme away, whatever its case.
 std::string_view withoutScheme(std::string_view text, std::string_view scheme) {
     const bool has =
         text.size() >= scheme.size() &&
-        std::ranges::equal(text.substr(0, scheme.size()), scheme, {}, lowered, lowered);
+        std::ranges::equal(text.substr(0, scheme.size()), scheme, {}, lowerAscii, lowerAscii);
     return has ? text.substr(scheme.size()) : text;
 }
 
@@ -44,7 +33,7 @@ std::string plainAddress(std::string_view address) {
     std::string plain(address);
     for (char& c : plain) {
         if (static_cast<unsigned char>(c) <= ' ' || c == 0x7f || c == '<' || c == '>') return {};
-        c = lowered(c);
+        c = lowerAscii(c);
     }
     return plain;
 }
@@ -95,7 +84,7 @@ std::string chatHandle(std::string_view address) {
         if (plain.size() > kLongestAddress || plain.size() < 4 || !isPlainUtf8(plain)) return {};
         for (char& c : plain) {
             if (static_cast<unsigned char>(c) <= ' ') return {};
-            c = lowered(c);
+            c = lowerAscii(c);
         }
         return "im:" + plain;
     }

@@ -7,6 +7,7 @@
 #include <array>
 #include <utility>
 
+#include "core/Text.h"
 #include "readers/ReaderLimits.h"
 
 namespace keepsakes {
@@ -17,8 +18,6 @@ bool isAlphanumeric(char c) {
     return (c >= '0' && c <= '9') || (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z');
 }
 
-char lowered(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; }
-
 /// ASCII that stands in no URL as it is (RFC 3986, 2).
 bool isForeign(char c) {
     const auto byte = static_cast<unsigned char>(c);
@@ -28,7 +27,7 @@ bool isForeign(char c) {
 /// The length of "http://" or "https://" at the start of the text, or 0.
 std::size_t schemeLength(std::string_view text) {
     for (const std::string_view scheme : {"http://", "https://"}) {
-        if (std::ranges::equal(text.substr(0, scheme.size()), scheme, {}, lowered)) {
+        if (std::ranges::equal(text.substr(0, scheme.size()), scheme, {}, lowerAscii)) {
             return scheme.size();
         }
     }
@@ -54,7 +53,7 @@ std::string plainUrl(std::string_view text) {
             continue;
         }
         const bool hasNoCase = i < length + authority.size() && escaped == 0;
-        url += hasNoCase ? lowered(text[i]) : text[i];
+        url += hasNoCase ? lowerAscii(text[i]) : text[i];
         escaped = text[i] == '%' ? 2 : escaped - std::min<std::size_t>(escaped, 1);
     }
     return url.size() > limits::kLongestUrl ? std::string() : url;

@@ -22,7 +22,7 @@ namespace keepsakes {
 namespace {
 
 /// The members that matter, by where they stand.
-enum class Place : std::uint8_t {
+enum class HistoryPlace : std::uint8_t {
     document,
     ignored,
     // Objects with a position and, most of them, a time: spots.
@@ -71,74 +71,77 @@ enum class Place : std::uint8_t {
 
 // Raw records, semantic history ("timelineObjects"), and the history that a device exports
 // ("semanticSegments", or an array of segments), whose positions are texts.
-constexpr auto kSteps = std::to_array<JsonStep<Place>>({
-    {Place::document, "locations", Place::record},
-    {Place::document, "timelineObjects", Place::timelineObject},
-    {Place::document, "semanticSegments", Place::segment},
-    {Place::document, "rawSignals", Place::rawSignal},
-    {Place::document, "userLocationProfile", Place::profile},
+constexpr auto kHistorySteps = std::to_array<JsonStep<HistoryPlace>>({
+    {HistoryPlace::document, "locations", HistoryPlace::record},
+    {HistoryPlace::document, "timelineObjects", HistoryPlace::timelineObject},
+    {HistoryPlace::document, "semanticSegments", HistoryPlace::segment},
+    {HistoryPlace::document, "rawSignals", HistoryPlace::rawSignal},
+    {HistoryPlace::document, "userLocationProfile", HistoryPlace::profile},
 
-    {Place::timelineObject, "placeVisit", Place::stay},
-    {Place::timelineObject, "activitySegment", Place::way},
-    {Place::stay, "location", Place::stayedAt},
-    {Place::stay, "duration", Place::duration},
-    {Place::stay, "simplifiedRawPath", Place::rawPath},
-    {Place::stay, "visitConfidence", Place::visitConfidence},
-    {Place::way, "startLocation", Place::from},
-    {Place::way, "endLocation", Place::to},
-    {Place::way, "duration", Place::duration},
-    {Place::way, "simplifiedRawPath", Place::rawPath},
-    {Place::way, "waypointPath", Place::waypointPath},
-    {Place::waypointPath, "waypoints", Place::waypoint},
-    {Place::rawPath, "points", Place::rawPoint},
-    {Place::duration, "startTimestamp", Place::start},
-    {Place::duration, "startTimestampMs", Place::start},
-    {Place::duration, "endTimestamp", Place::end},
-    {Place::duration, "endTimestampMs", Place::end},
+    {HistoryPlace::timelineObject, "placeVisit", HistoryPlace::stay},
+    {HistoryPlace::timelineObject, "activitySegment", HistoryPlace::way},
+    {HistoryPlace::stay, "location", HistoryPlace::stayedAt},
+    {HistoryPlace::stay, "duration", HistoryPlace::duration},
+    {HistoryPlace::stay, "simplifiedRawPath", HistoryPlace::rawPath},
+    {HistoryPlace::stay, "visitConfidence", HistoryPlace::visitConfidence},
+    {HistoryPlace::way, "startLocation", HistoryPlace::from},
+    {HistoryPlace::way, "endLocation", HistoryPlace::to},
+    {HistoryPlace::way, "duration", HistoryPlace::duration},
+    {HistoryPlace::way, "simplifiedRawPath", HistoryPlace::rawPath},
+    {HistoryPlace::way, "waypointPath", HistoryPlace::waypointPath},
+    {HistoryPlace::waypointPath, "waypoints", HistoryPlace::waypoint},
+    {HistoryPlace::rawPath, "points", HistoryPlace::rawPoint},
+    {HistoryPlace::duration, "startTimestamp", HistoryPlace::start},
+    {HistoryPlace::duration, "startTimestampMs", HistoryPlace::start},
+    {HistoryPlace::duration, "endTimestamp", HistoryPlace::end},
+    {HistoryPlace::duration, "endTimestampMs", HistoryPlace::end},
 
-    {Place::segment, "startTime", Place::start},
-    {Place::segment, "endTime", Place::end},
-    {Place::segment, "startTimeTimezoneUtcOffsetMinutes", Place::startOffset},
-    {Place::segment, "endTimeTimezoneUtcOffsetMinutes", Place::endOffset},
-    {Place::segment, "visit", Place::visit},
-    {Place::segment, "activity", Place::activity},
-    {Place::segment, "timelinePath", Place::pathPoint},
-    {Place::visit, "probability", Place::visitProbability},
-    {Place::visit, "hierarchyLevel", Place::hierarchyLevel},
-    {Place::visit, "topCandidate", Place::stayedAt},
-    {Place::activity, "start", Place::from},
-    {Place::activity, "end", Place::to},
-    {Place::rawSignal, "position", Place::signal},
-    {Place::profile, "frequentPlaces", Place::favourite},
+    {HistoryPlace::segment, "startTime", HistoryPlace::start},
+    {HistoryPlace::segment, "endTime", HistoryPlace::end},
+    {HistoryPlace::segment, "startTimeTimezoneUtcOffsetMinutes", HistoryPlace::startOffset},
+    {HistoryPlace::segment, "endTimeTimezoneUtcOffsetMinutes", HistoryPlace::endOffset},
+    {HistoryPlace::segment, "visit", HistoryPlace::visit},
+    {HistoryPlace::segment, "activity", HistoryPlace::activity},
+    {HistoryPlace::segment, "timelinePath", HistoryPlace::pathPoint},
+    {HistoryPlace::visit, "probability", HistoryPlace::visitProbability},
+    {HistoryPlace::visit, "hierarchyLevel", HistoryPlace::hierarchyLevel},
+    {HistoryPlace::visit, "topCandidate", HistoryPlace::stayedAt},
+    {HistoryPlace::activity, "start", HistoryPlace::from},
+    {HistoryPlace::activity, "end", HistoryPlace::to},
+    {HistoryPlace::rawSignal, "position", HistoryPlace::signal},
+    {HistoryPlace::profile, "frequentPlaces", HistoryPlace::favourite},
 });
 
 /// The values that a spot of any kind may have.
-constexpr auto kSpotValues = std::to_array<std::pair<std::string_view, Place>>({
-    {"latitudeE7", Place::latitudeE7},
-    {"latE7", Place::latitudeE7},
-    {"longitudeE7", Place::longitudeE7},
-    {"lngE7", Place::longitudeE7},
-    {"accuracy", Place::accuracy},
-    {"accuracyMeters", Place::accuracy},
-    {"accuracyMetres", Place::accuracy},
-    {"timestamp", Place::time},
-    {"timestampMs", Place::time},
-    {"time", Place::time},
-    {"latLng", Place::degrees},
-    {"LatLng", Place::degrees},
-    {"point", Place::degrees},
-    {"placeLocation", Place::degrees},
-    {"durationMinutesOffsetFromStartTime", Place::minutesFromStart},
-    {"name", Place::name},
-    {"address", Place::address},
-    {"semanticType", Place::label},
-    {"label", Place::label},
-    {"locationConfidence", Place::placeConfidence},
+constexpr auto kSpotValues = std::to_array<std::pair<std::string_view, HistoryPlace>>({
+    {"latitudeE7", HistoryPlace::latitudeE7},
+    {"latE7", HistoryPlace::latitudeE7},
+    {"longitudeE7", HistoryPlace::longitudeE7},
+    {"lngE7", HistoryPlace::longitudeE7},
+    {"accuracy", HistoryPlace::accuracy},
+    {"accuracyMeters", HistoryPlace::accuracy},
+    {"accuracyMetres", HistoryPlace::accuracy},
+    {"timestamp", HistoryPlace::time},
+    {"timestampMs", HistoryPlace::time},
+    {"time", HistoryPlace::time},
+    {"latLng", HistoryPlace::degrees},
+    {"LatLng", HistoryPlace::degrees},
+    {"point", HistoryPlace::degrees},
+    {"placeLocation", HistoryPlace::degrees},
+    {"durationMinutesOffsetFromStartTime", HistoryPlace::minutesFromStart},
+    {"name", HistoryPlace::name},
+    {"address", HistoryPlace::address},
+    {"semanticType", HistoryPlace::label},
+    {"label", HistoryPlace::label},
+    {"locationConfidence", HistoryPlace::placeConfidence},
 });
 
-bool isSpot(Place place) { return place >= Place::record && place <= Place::favourite; }
-bool isSpan(Place place) {
-    return place == Place::stay || place == Place::way || place == Place::segment;
+bool isSpot(HistoryPlace place) {
+    return place >= HistoryPlace::record && place <= HistoryPlace::favourite;
+}
+bool isSpan(HistoryPlace place) {
+    return place == HistoryPlace::stay || place == HistoryPlace::way ||
+           place == HistoryPlace::segment;
 }
 
 /// Some histories hold degrees west and south as though the 32 bits had no sign.
@@ -190,7 +193,7 @@ struct Span {
     bool isStay = false;
 };
 
-class LocationHistory final : public JsonPlaces<Place> {
+class LocationHistory final : public JsonPlaces<HistoryPlace> {
   public:
     LocationHistory(const ReaderContext& context, LocationSink& places)
         : times_(context.now), now_(context.now), places_(places) {}
@@ -205,46 +208,46 @@ class LocationHistory final : public JsonPlaces<Place> {
     }
 
   protected:
-    Place placeOf(Place parent, std::string_view name) const override {
-        if (isSpot(parent) || parent == Place::degrees) {
-            const auto* const value =
-                std::ranges::find(kSpotValues, name, &std::pair<std::string_view, Place>::first);
-            return value == kSpotValues.end() ? Place::ignored : value->second;
+    HistoryPlace placeOf(HistoryPlace parent, std::string_view name) const override {
+        if (isSpot(parent) || parent == HistoryPlace::degrees) {
+            const auto* const value = std::ranges::find(
+                kSpotValues, name, &std::pair<std::string_view, HistoryPlace>::first);
+            return value == kSpotValues.end() ? HistoryPlace::ignored : value->second;
         }
-        return stepFrom<Place>(parent, name, kSteps);
+        return stepFrom<HistoryPlace>(parent, name, kHistorySteps);
     }
 
-    Place elementOfDocument() const override { return Place::segment; }
+    HistoryPlace elementOfDocument() const override { return HistoryPlace::segment; }
 
-    void enter(Place place) override {
+    void enter(HistoryPlace place) override {
         if (isSpan(place)) span_ = {};
         if (isSpot(place)) {
             spot_ = spotAt(place);
             *spot_ = {};
         }
-        if (place == Place::stay || place == Place::visit) span_.isStay = true;
+        if (place == HistoryPlace::stay || place == HistoryPlace::visit) span_.isStay = true;
     }
 
-    void leave(Place place) override {
+    void leave(HistoryPlace place) override {
         switch (place) {
-            case Place::record:
-            case Place::rawPoint:
-            case Place::signal:
+            case HistoryPlace::record:
+            case HistoryPlace::rawPoint:
+            case HistoryPlace::signal:
                 tellPoint(loose_.position(), loose_.time, loose_.accuracyMeters);
                 break;
-            case Place::pathPoint:
+            case HistoryPlace::pathPoint:
                 endPathPoint();
                 break;
-            case Place::waypoint:
+            case HistoryPlace::waypoint:
                 if (!span_.firstWaypoint) span_.firstWaypoint = loose_.position();
                 span_.lastWaypoint = loose_.position();
                 break;
-            case Place::favourite:
+            case HistoryPlace::favourite:
                 tellFavourite();
                 break;
-            case Place::stay:
-            case Place::way:
-            case Place::segment:
+            case HistoryPlace::stay:
+            case HistoryPlace::way:
+            case HistoryPlace::segment:
                 endSpan();
                 break;
             default:
@@ -252,41 +255,41 @@ class LocationHistory final : public JsonPlaces<Place> {
         }
     }
 
-    void take(Place place, const JsonScalar& value) override {
+    void take(HistoryPlace place, const JsonScalar& value) override {
         switch (place) {
-            case Place::latitudeE7:
+            case HistoryPlace::latitudeE7:
                 spot_->latitude = degreesOfE7(value.asNumber(), 90);
                 break;
-            case Place::longitudeE7:
+            case HistoryPlace::longitudeE7:
                 spot_->longitude = degreesOfE7(value.asNumber(), 180);
                 break;
-            case Place::degrees:
+            case HistoryPlace::degrees:
                 spot_->stated = positionOfText(value.text.value_or(""));
                 break;
-            case Place::accuracy:
+            case HistoryPlace::accuracy:
                 spot_->accuracyMeters = accuracyOf(value);
                 break;
-            case Place::time:
+            case HistoryPlace::time:
                 spot_->time = times_.take(timeOf(value));
                 break;
-            case Place::minutesFromStart:
+            case HistoryPlace::minutesFromStart:
                 spot_->minutesFromStart = value.asNumber();
                 break;
-            case Place::name:
+            case HistoryPlace::name:
                 spot_->name = nameOf(value);
                 break;
-            case Place::address:
+            case HistoryPlace::address:
                 spot_->address = firstPart(value);
                 break;
-            case Place::label:
+            case HistoryPlace::label:
                 spot_->use = useOfLabel(value.text.value_or(""));
                 break;
-            case Place::placeConfidence:
+            case HistoryPlace::placeConfidence:
                 spot_->confidence = value.asNumber();
                 break;
             // The ends of a way may be texts themselves.
-            case Place::from:
-            case Place::to:
+            case HistoryPlace::from:
+            case HistoryPlace::to:
                 spotAt(place)->stated = positionOfText(value.text.value_or(""));
                 break;
             default:
@@ -295,40 +298,40 @@ class LocationHistory final : public JsonPlaces<Place> {
     }
 
   private:
-    Spot* spotAt(Place place) {
+    Spot* spotAt(HistoryPlace place) {
         switch (place) {
-            case Place::stayedAt:
+            case HistoryPlace::stayedAt:
                 return &span_.stayedAt;
-            case Place::from:
+            case HistoryPlace::from:
                 return &span_.from;
-            case Place::to:
+            case HistoryPlace::to:
                 return &span_.to;
             default:
                 return &loose_;
         }
     }
 
-    void takeOfSpan(Place place, const JsonScalar& value) {
+    void takeOfSpan(HistoryPlace place, const JsonScalar& value) {
         switch (place) {
-            case Place::start:
+            case HistoryPlace::start:
                 span_.start = times_.take(timeOf(value));
                 break;
-            case Place::end:
+            case HistoryPlace::end:
                 span_.end = times_.take(timeOf(value));
                 break;
-            case Place::startOffset:
+            case HistoryPlace::startOffset:
                 span_.startOffset = value.asNumber();
                 break;
-            case Place::endOffset:
+            case HistoryPlace::endOffset:
                 span_.endOffset = value.asNumber();
                 break;
-            case Place::visitConfidence:
+            case HistoryPlace::visitConfidence:
                 span_.percent = value.asNumber();
                 break;
-            case Place::visitProbability:
+            case HistoryPlace::visitProbability:
                 span_.probability = value.asNumber();
                 break;
-            case Place::hierarchyLevel:
+            case HistoryPlace::hierarchyLevel:
                 span_.level = value.asNumber();
                 break;
             default:

@@ -16,18 +16,6 @@ namespace {
 constexpr std::size_t kDeepestPart = 8;
 constexpr std::size_t kLongestBoundary = 70;  // RFC 2046, 5.1.1
 
-std::string_view trimmed(std::string_view text) {
-    const auto first = text.find_first_not_of(" \t");
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(" \t") - first + 1);
-}
-
-int hexDigit(char c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
-    return c >= 'a' && c <= 'f' ? c - 'a' + 10 : -1;
-}
-
 /// The six bits of a digit of base64 (RFC 4648, 4), or -1.
 int base64Digit(char c) {
     if (c >= 'A' && c <= 'Z') return c - 'A';

@@ -7,6 +7,7 @@
 #include <charconv>
 
 #include "core/MurmurHash3.h"
+#include "core/Text.h"
 #include "readers/Handles.h"
 #include "readers/ReaderLimits.h"
 
@@ -14,25 +15,15 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::uint32_t kIdentitySeed = 0x6d61696c;
-
-char lowered(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; }
+constexpr std::uint32_t kMailIdentitySeed = 0x6d61696c;
 
 bool same(std::string_view text, std::string_view lowerCase) {
-    return std::ranges::equal(text, lowerCase, {}, lowered);
+    return std::ranges::equal(text, lowerCase, {}, lowerAscii);
 }
 
 bool startsWith(std::string_view text, std::string_view lowerCase) {
     return same(text.substr(0, lowerCase.size()), lowerCase);
 }
-
-std::string_view trimmed(std::string_view text) {
-    const auto first = text.find_first_not_of(" \t");
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(" \t") - first + 1);
-}
-
-bool isDigit(char c) { return c >= '0' && c <= '9'; }
 
 /// Walks a field of addresses and gives each one's text, without names and comments.
 class AddressList {
@@ -254,7 +245,7 @@ std::expected<InteractionRecord, std::string> MailHeaders::record(KSDate now) co
         murmurHash3(named.empty() ? fmt::format("{}\n{}\n{}\n{}", fields_[date], fields_[from],
                                                 fields_[to], fields_[subject])
                                   : named,
-                    kIdentitySeed);
+                    kMailIdentitySeed);
     return record;
 }
 

@@ -22,7 +22,7 @@ namespace {
 using Mechanism = InteractionMechanism;
 using Direction = InteractionDirection;
 
-constexpr std::uint32_t kIdentitySeed = 0x736d7321;
+constexpr std::uint32_t kMessageIdentitySeed = 0x736d7321;
 
 // Values of Android's telephony provider, which the format writes as they are.
 constexpr int kBoxReceived = 1;
@@ -249,7 +249,7 @@ class Backup final : public XmlHandler {
     }
 
     void finish(InteractionRecord& record, const std::string& identity) {
-        record.identity = murmurHash3(identity, kIdentitySeed);
+        record.identity = murmurHash3(identity, kMessageIdentitySeed);
         sink_.interaction(record);
         ++taken_;
     }

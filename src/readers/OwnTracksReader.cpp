@@ -18,7 +18,7 @@ namespace keepsakes {
 
 namespace {
 
-enum class Place : std::uint8_t {
+enum class OwnTracksPlace : std::uint8_t {
     document,
     ignored,
     type,
@@ -30,7 +30,7 @@ enum class Place : std::uint8_t {
 };
 
 /// One message of the device, as the recorder keeps it.
-class Message final : public JsonPlaces<Place> {
+class Message final : public JsonPlaces<OwnTracksPlace> {
   public:
     std::string type;
     std::optional<double> latitude;
@@ -40,38 +40,38 @@ class Message final : public JsonPlaces<Place> {
     std::string description;
 
   protected:
-    Place placeOf(Place parent, std::string_view name) const override {
-        if (parent != Place::document) return Place::ignored;
-        if (name == "_type") return Place::type;
-        if (name == "lat") return Place::latitude;
-        if (name == "lon") return Place::longitude;
-        if (name == "tst") return Place::time;
-        if (name == "acc") return Place::accuracy;
-        if (name == "desc") return Place::description;
-        return Place::ignored;
+    OwnTracksPlace placeOf(OwnTracksPlace parent, std::string_view name) const override {
+        if (parent != OwnTracksPlace::document) return OwnTracksPlace::ignored;
+        if (name == "_type") return OwnTracksPlace::type;
+        if (name == "lat") return OwnTracksPlace::latitude;
+        if (name == "lon") return OwnTracksPlace::longitude;
+        if (name == "tst") return OwnTracksPlace::time;
+        if (name == "acc") return OwnTracksPlace::accuracy;
+        if (name == "desc") return OwnTracksPlace::description;
+        return OwnTracksPlace::ignored;
     }
 
-    void enter(Place) override {}
-    void leave(Place) override {}
+    void enter(OwnTracksPlace) override {}
+    void leave(OwnTracksPlace) override {}
 
-    void take(Place place, const JsonScalar& value) override {
+    void take(OwnTracksPlace place, const JsonScalar& value) override {
         switch (place) {
-            case Place::type:
+            case OwnTracksPlace::type:
                 type = value.text.value_or("");
                 break;
-            case Place::latitude:
+            case OwnTracksPlace::latitude:
                 latitude = value.asNumber();
                 break;
-            case Place::longitude:
+            case OwnTracksPlace::longitude:
                 longitude = value.asNumber();
                 break;
-            case Place::time:
+            case OwnTracksPlace::time:
                 time = timeOf(value);
                 break;
-            case Place::accuracy:
+            case OwnTracksPlace::accuracy:
                 accuracyMeters = accuracyOf(value);
                 break;
-            case Place::description:
+            case OwnTracksPlace::description:
                 description = nameOf(value);
                 break;
             default:

@@ -6,26 +6,20 @@
 #include <string>
 
 #include "core/Calendar.h"
+#include "core/Text.h"
 #include "readers/ReaderLimits.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kDay = 86400;
+constexpr std::string_view kPadding{" \0", 2};
 constexpr double kOffsetStep = 900;
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kPadding{" \0", 2};
-    const auto first = text.find_first_not_of(kPadding);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kPadding) - first + 1);
-}
 
 }  // namespace
 
 std::optional<ParsedDate> parseExifTime(std::string_view text) {
-    std::string iso(trimmed(text));
+    std::string iso(trimmed(text, kPadding));
     constexpr std::size_t kAfterYear = 4;
     constexpr std::size_t kAfterMonth = 7;
     if (iso.size() <= kAfterMonth || iso.starts_with("0000")) return std::nullopt;
@@ -38,7 +32,7 @@ std::optional<ParsedDate> parseExifTime(std::string_view text) {
 }
 
 std::optional<int> parseExifOffset(std::string_view text) {
-    const auto parsed = parseISO8601("2001-01-01T00:00:00" + std::string(trimmed(text)));
+    const auto parsed = parseISO8601("2001-01-01T00:00:00" + std::string(trimmed(text, kPadding)));
     if (!parsed || !parsed->offsetSeconds || !limits::isOffset(*parsed->offsetSeconds)) {
         return std::nullopt;
     }

@@ -11,13 +11,13 @@ namespace keepsakes {
 
 namespace {
 
-struct Row {
+struct PhotoRow {
     std::string_view meaning;
     std::string_view words;  ///< Apart by blanks; a blank within a word is written as a hyphen.
 };
 
 // Each word itself is a row's first; then English, German, French, Spanish, Italian, Dutch.
-constexpr auto kInferences = std::to_array<Row>({
+constexpr auto kInferences = std::to_array<PhotoRow>({
     {"baby",
      "baby babies newborn infant toddler säugling kleinkind neugeborenes bébé nourrisson "
      "nouveau-né bebé recién-nacido neonato bambino-piccolo bimbo zuigeling pasgeborene"},
@@ -130,7 +130,7 @@ constexpr auto kInferences = std::to_array<Row>({
      "bijeenkomst familiebijeenkomst"},
 });
 
-constexpr auto kHolidays = std::to_array<Row>({
+constexpr auto kHolidays = std::to_array<PhotoRow>({
     {"Christmas",
      "christmas xmas christmas-day weihnachten weihnachtsfest noël navidad natale "
      "kerst kerstmis"},
@@ -165,17 +165,17 @@ constexpr auto kHolidays = std::to_array<Row>({
     {"Saint Nicholas Day", "saint-nicholas-day nikolaus nikolaustag saint-nicolas sinterklaas"},
 });
 
-using Table = std::unordered_map<std::string, std::string_view>;
+using MeaningTable = std::unordered_map<std::string, std::string_view>;
 
-Table tableOf(std::span<const Row> rows) {
-    Table table;
+MeaningTable tableOf(std::span<const PhotoRow> rows) {
+    MeaningTable table;
     for (const auto& row : rows) {
         for (auto& word : foldedWords(row.words)) table.try_emplace(std::move(word), row.meaning);
     }
     return table;
 }
 
-std::optional<std::string_view> lookUp(const Table& table, std::string_view keyword) {
+std::optional<std::string_view> lookUp(const MeaningTable& table, std::string_view keyword) {
     const auto found = table.find(foldWord(keyword));
     return found == table.end() ? std::nullopt : std::optional(found->second);
 }
@@ -183,13 +183,13 @@ std::optional<std::string_view> lookUp(const Table& table, std::string_view keyw
 }  // namespace
 
 std::optional<std::string_view> inferenceOfKeyword(std::string_view keyword) {
-    static const Table table = tableOf(kInferences);
+    static const MeaningTable table = tableOf(kInferences);
     if (const auto inference = lookUp(table, keyword)) return inference;
     return holidayOfKeyword(keyword) ? std::optional(kInferenceHolidayEvent) : std::nullopt;
 }
 
 std::optional<std::string_view> holidayOfKeyword(std::string_view keyword) {
-    static const Table table = tableOf(kHolidays);
+    static const MeaningTable table = tableOf(kHolidays);
     return lookUp(table, keyword);
 }
 

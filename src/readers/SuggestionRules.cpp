@@ -174,7 +174,7 @@ constexpr auto kNouns = std::to_array<CategoryNoun>({
 // ---- How they are applied. ----
 
 /// Steps after which ICU gives an expression up; strangers write the texts.
-constexpr std::int32_t kMostSteps = 2000;
+constexpr std::int32_t kMostRegexSteps = 2000;
 constexpr std::int32_t kMostStack = 1 << 20;
 
 class Expression {
@@ -196,7 +196,7 @@ class Expression {
         if (!pattern_) return nullptr;
         std::unique_ptr<icu::RegexMatcher> matcher(pattern_->matcher(text, status));
         if (U_FAILURE(status)) return nullptr;
-        matcher->setTimeLimit(kMostSteps, status);
+        matcher->setTimeLimit(kMostRegexSteps, status);
         matcher->setStackLimit(kMostStack, status);
         return matcher->find(status) && U_SUCCESS(status) ? std::move(matcher) : nullptr;
     }

@@ -5,6 +5,7 @@
 #include <utility>
 #include <vector>
 
+#include "core/Text.h"
 #include "readers/SuggestionRules.h"
 #include "readers/TextFolding.h"
 
@@ -123,11 +124,8 @@ constexpr auto kStationWords = std::to_array<std::string_view>({
     "meidling",
 });
 
-std::string_view trimmed(std::string_view text) {
-    const auto begin = text.find_first_not_of(" \t.;:-");
-    if (begin == std::string_view::npos) return {};
-    return text.substr(begin, text.find_last_not_of(" \t.;:-") - begin + 1);
-}
+/// What may stand around the name of a place.
+constexpr std::string_view kEdges = " \t.;:-";
 
 bool isCode(std::string_view text) {
     return text.size() == 3 &&
@@ -137,11 +135,11 @@ bool isCode(std::string_view text) {
 }  // namespace
 
 std::string townIn(std::string_view place) {
-    place = trimmed(place.substr(0, place.find_first_of("(,/|")));
+    place = trimmed(place.substr(0, place.find_first_of("(,/|")), kEdges);
     // "ICE 597 Berlin": the number of a train or flight stands before the town.
     const auto digit = place.find_last_of("0123456789");
     if (digit != std::string_view::npos && digit + 2 < place.size() && place[digit + 1] == ' ') {
-        place = trimmed(place.substr(digit + 1));
+        place = trimmed(place.substr(digit + 1), kEdges);
     }
     if (isCode(place)) {
         const auto* const found = std::ranges::lower_bound(kAirports, place, {}, &Airport::first);
@@ -160,9 +158,9 @@ std::string townIn(std::string_view place) {
             return std::ranges::find(kStationWords, word) != kStationWords.end();
         };
         if (before != std::string_view::npos && isWord(lastTwo)) {
-            place = trimmed(place.substr(0, before));
+            place = trimmed(place.substr(0, before), kEdges);
         } else if (isWord(last)) {
-            place = trimmed(place.substr(0, blank));
+            place = trimmed(place.substr(0, blank), kEdges);
         } else {
             break;
         }
@@ -187,7 +185,7 @@ std::string townOfAddress(std::string_view address) {
     std::vector<std::string_view> parts;
     while (!address.empty()) {
         const auto end = std::min(address.find(','), address.size());
-        parts.push_back(trimmed(address.substr(0, end)));
+        parts.push_back(trimmed(address.substr(0, end), kEdges));
         address.remove_prefix(std::min(end + 1, address.size()));
     }
     // "FI-02600 Espoo", "1012 AB Amsterdam": the words behind the postal code.
@@ -196,10 +194,10 @@ std::string townOfAddress(std::string_view address) {
         if (digit > 3) continue;
         const auto end = std::min(part.find_first_not_of("0123456789-", digit), part.size());
         if (end - digit < 4 || end == part.size() || part[end] != ' ') continue;
-        auto town = trimmed(part.substr(end));
+        auto town = trimmed(part.substr(end), kEdges);
         if (town.size() > 3 && town[2] == ' ' &&
             std::isupper(static_cast<unsigned char>(town[1])) != 0) {
-            town = trimmed(town.substr(3));
+            town = trimmed(town.substr(3), kEdges);
         }
         if (!town.empty()) return std::string(town);
     }

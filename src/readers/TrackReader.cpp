@@ -12,6 +12,7 @@
 #include <utility>
 #include <vector>
 
+#include "core/Text.h"
 #include "readers/Position.h"
 #include "readers/ReaderLimits.h"
 #include "readers/StatedPlaces.h"
@@ -23,7 +24,7 @@ namespace keepsakes {
 namespace {
 
 /// The elements that matter, by where they stand. Everything else is `ignored`, with all in it.
-enum class Place : std::uint8_t {
+enum class TrackPlace : std::uint8_t {
     document,
     ignored,
     gpx,
@@ -51,69 +52,62 @@ enum class Place : std::uint8_t {
 };
 
 struct Step {
-    Place parent;
+    TrackPlace parent;
     std::string_view name;
-    Place child;
+    TrackPlace child;
 };
 
 // GPX 1.0 and 1.1: routes are no recordings; waypoints are places that the owner named. TCX v2:
 // courses and workout plans are none either.
-constexpr auto kSteps = std::to_array<Step>({
-    {Place::gpxPoint, "time", Place::pointTime},
-    {Place::gpxSegment, "trkpt", Place::gpxPoint},
-    {Place::gpxTrack, "trkseg", Place::gpxSegment},
-    {Place::gpxTrack, "type", Place::gpxType},
-    {Place::gpx, "trk", Place::gpxTrack},
-    {Place::gpx, "wpt", Place::waypoint},
-    {Place::waypoint, "name", Place::waypointName},
-    {Place::waypoint, "type", Place::waypointWord},
-    {Place::waypoint, "sym", Place::waypointWord},
-    {Place::document, "gpx", Place::gpx},
-    {Place::tcxPoint, "Time", Place::pointTime},
-    {Place::tcxPoint, "Position", Place::tcxPosition},
-    {Place::tcxPoint, "DistanceMeters", Place::tcxDistance},
-    {Place::tcxPosition, "LatitudeDegrees", Place::latitude},
-    {Place::tcxPosition, "LongitudeDegrees", Place::longitude},
-    {Place::tcxTrack, "Trackpoint", Place::tcxPoint},
-    {Place::lap, "Track", Place::tcxTrack},
-    {Place::lap, "TotalTimeSeconds", Place::lapSeconds},
-    {Place::activity, "Lap", Place::lap},
-    {Place::activities, "Activity", Place::activity},
-    {Place::activities, "MultiSportSession", Place::multiSport},
-    {Place::multiSport, "FirstSport", Place::sportOfMany},
-    {Place::multiSport, "NextSport", Place::sportOfMany},
-    {Place::sportOfMany, "Activity", Place::activity},
-    {Place::tcx, "Activities", Place::activities},
-    {Place::document, "TrainingCenterDatabase", Place::tcx},
+constexpr auto kTrackSteps = std::to_array<Step>({
+    {TrackPlace::gpxPoint, "time", TrackPlace::pointTime},
+    {TrackPlace::gpxSegment, "trkpt", TrackPlace::gpxPoint},
+    {TrackPlace::gpxTrack, "trkseg", TrackPlace::gpxSegment},
+    {TrackPlace::gpxTrack, "type", TrackPlace::gpxType},
+    {TrackPlace::gpx, "trk", TrackPlace::gpxTrack},
+    {TrackPlace::gpx, "wpt", TrackPlace::waypoint},
+    {TrackPlace::waypoint, "name", TrackPlace::waypointName},
+    {TrackPlace::waypoint, "type", TrackPlace::waypointWord},
+    {TrackPlace::waypoint, "sym", TrackPlace::waypointWord},
+    {TrackPlace::document, "gpx", TrackPlace::gpx},
+    {TrackPlace::tcxPoint, "Time", TrackPlace::pointTime},
+    {TrackPlace::tcxPoint, "Position", TrackPlace::tcxPosition},
+    {TrackPlace::tcxPoint, "DistanceMeters", TrackPlace::tcxDistance},
+    {TrackPlace::tcxPosition, "LatitudeDegrees", TrackPlace::latitude},
+    {TrackPlace::tcxPosition, "LongitudeDegrees", TrackPlace::longitude},
+    {TrackPlace::tcxTrack, "Trackpoint", TrackPlace::tcxPoint},
+    {TrackPlace::lap, "Track", TrackPlace::tcxTrack},
+    {TrackPlace::lap, "TotalTimeSeconds", TrackPlace::lapSeconds},
+    {TrackPlace::activity, "Lap", TrackPlace::lap},
+    {TrackPlace::activities, "Activity", TrackPlace::activity},
+    {TrackPlace::activities, "MultiSportSession", TrackPlace::multiSport},
+    {TrackPlace::multiSport, "FirstSport", TrackPlace::sportOfMany},
+    {TrackPlace::multiSport, "NextSport", TrackPlace::sportOfMany},
+    {TrackPlace::sportOfMany, "Activity", TrackPlace::activity},
+    {TrackPlace::tcx, "Activities", TrackPlace::activities},
+    {TrackPlace::document, "TrainingCenterDatabase", TrackPlace::tcx},
 });
 
-Place placeOf(Place parent, std::string_view name) {
+TrackPlace placeOf(TrackPlace parent, std::string_view name) {
     const auto* const found = std::ranges::find_if(
-        kSteps, [&](const Step& step) { return step.parent == parent && step.name == name; });
-    return found == kSteps.end() ? Place::ignored : found->child;
+        kTrackSteps, [&](const Step& step) { return step.parent == parent && step.name == name; });
+    return found == kTrackSteps.end() ? TrackPlace::ignored : found->child;
 }
 
-bool holdsValue(Place place) {
+bool holdsValue(TrackPlace place) {
     switch (place) {
-        case Place::gpxType:
-        case Place::waypointName:
-        case Place::waypointWord:
-        case Place::lapSeconds:
-        case Place::tcxDistance:
-        case Place::latitude:
-        case Place::longitude:
-        case Place::pointTime:
+        case TrackPlace::gpxType:
+        case TrackPlace::waypointName:
+        case TrackPlace::waypointWord:
+        case TrackPlace::lapSeconds:
+        case TrackPlace::tcxDistance:
+        case TrackPlace::latitude:
+        case TrackPlace::longitude:
+        case TrackPlace::pointTime:
             return true;
         default:
             return false;
     }
-}
-
-std::string_view trimmed(std::string_view text) {
-    constexpr std::string_view kBlanks = " \t\r\n";
-    const auto first = text.find_first_not_of(kBlanks);
-    if (first == std::string_view::npos) return {};
-    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 
 std::optional<double> number(std::optional<std::string_view> text) {
@@ -143,13 +137,13 @@ class TrackFile final : public XmlHandler {
         : now_(context.now), places_(places), times_(context.now) {}
 
     void startElement(std::string_view name, XmlAttributes attributes) override {
-        const auto parent = path_.empty() ? Place::document : path_.back();
+        const auto parent = path_.empty() ? TrackPlace::document : path_.back();
         const auto place = placeOf(parent, name);
-        if (path_.empty() && place == Place::ignored) {
+        if (path_.empty() && place == TrackPlace::ignored) {
             otherRoot_ = std::string(name.substr(0, limits::kLongestValue));
         }
         path_.push_back(place);
-        if (place == Place::ignored) return;
+        if (place == TrackPlace::ignored) return;
         value_.clear();
         enter(place, attributes);
     }
@@ -178,37 +172,37 @@ class TrackFile final : public XmlHandler {
     }
 
   private:
-    void enter(Place place, XmlAttributes attributes) {
+    void enter(TrackPlace place, XmlAttributes attributes) {
         switch (place) {
-            case Place::gpxTrack:
+            case TrackPlace::gpxTrack:
                 track_.emplace(false);
                 break;
-            case Place::activity:
+            case TrackPlace::activity:
                 track_.emplace(true);
                 if (const auto sport = attributes.find("Sport")) track_->setType(*sport);
                 break;
-            case Place::gpxSegment:
-            case Place::tcxTrack:
+            case TrackPlace::gpxSegment:
+            case TrackPlace::tcxTrack:
                 track_->breakLeg();
                 break;
-            case Place::gpxPoint:
+            case TrackPlace::gpxPoint:
                 startPoint();
                 point_.position =
                     geoPoint(number(attributes.find("lat")), number(attributes.find("lon")));
                 break;
-            case Place::tcxPoint:
+            case TrackPlace::tcxPoint:
                 startPoint();
                 break;
-            case Place::waypoint:
+            case TrackPlace::waypoint:
                 waypoint_ = {};
                 waypointPosition_ =
                     geoPoint(number(attributes.find("lat")), number(attributes.find("lon")));
                 break;
-            case Place::tcxPosition:
+            case TrackPlace::tcxPosition:
                 latitude_.reset();
                 longitude_.reset();
                 break;
-            case Place::lap:
+            case TrackPlace::lap:
                 lapStart_ = attributes.find("StartTime") ? time(*attributes.find("StartTime"))
                                                          : std::nullopt;
                 lapSeconds_.reset();
@@ -218,51 +212,51 @@ class TrackFile final : public XmlHandler {
         }
     }
 
-    void leave(Place place) {
+    void leave(TrackPlace place) {
         switch (place) {
-            case Place::gpxType:
+            case TrackPlace::gpxType:
                 if (auto type = value()) track_->setType(*type);
                 break;
-            case Place::pointTime:
+            case TrackPlace::pointTime:
                 pointTime_ = time(value().value_or(""));
                 break;
-            case Place::tcxDistance:
+            case TrackPlace::tcxDistance:
                 point_.distance = number(value());
                 break;
-            case Place::latitude:
+            case TrackPlace::latitude:
                 latitude_ = number(value());
                 break;
-            case Place::longitude:
+            case TrackPlace::longitude:
                 longitude_ = number(value());
                 break;
-            case Place::tcxPosition:
+            case TrackPlace::tcxPosition:
                 point_.position = geoPoint(latitude_, longitude_);
                 break;
-            case Place::gpxPoint:
-            case Place::tcxPoint:
+            case TrackPlace::gpxPoint:
+            case TrackPlace::tcxPoint:
                 endPoint();
                 break;
-            case Place::waypointName:
+            case TrackPlace::waypointName:
                 waypoint_.name = cleanText(value().value_or(""));
                 break;
-            case Place::waypointWord:
+            case TrackPlace::waypointWord:
                 // How receivers call the symbol of a house.
                 if (value() == "Residence") waypoint_.use = PlaceUse::home;
                 if (waypoint_.use == PlaceUse::unknown) {
                     waypoint_.use = useOfPlaceName(value().value_or(""));
                 }
                 break;
-            case Place::waypoint:
+            case TrackPlace::waypoint:
                 endWaypoint();
                 break;
-            case Place::lapSeconds:
+            case TrackPlace::lapSeconds:
                 lapSeconds_ = number(value());
                 break;
-            case Place::lap:
+            case TrackPlace::lap:
                 endLap();
                 break;
-            case Place::gpxTrack:
-            case Place::activity:
+            case TrackPlace::gpxTrack:
+            case TrackPlace::activity:
                 endTrack();
                 break;
             default:
@@ -320,7 +314,7 @@ class TrackFile final : public XmlHandler {
     KSDate now_;
     LocationSink& places_;
     FileRecords records_;
-    std::vector<Place> path_;  // as deep as the parser allows
+    std::vector<TrackPlace> path_;  // as deep as the parser allows
     std::string otherRoot_;
     std::string value_;
     bool tooMany_ = false;

@@ -16,12 +16,6 @@
 
 namespace keepsakes {
 
-namespace {
-
-constexpr std::string_view kUnit = "KSManageServer";
-
-}  // namespace
-
 KSManageServer::KSManageServer(const PlatformServices& platform,
                                std::unique_ptr<KSDaemonClient> client,
                                std::unique_ptr<StatusReporter> status)

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <memory>
+#include <string_view>
 
 #include "core/ServiceLookup.h"
 
@@ -26,6 +27,8 @@ class KSManageServer final : public KSService {
     KSDaemonClient& client() { return *client_; }
 
   private:
+    static constexpr std::string_view kUnit = "KSManageServer";
+
     KSManageServer(const PlatformServices& platform, std::unique_ptr<KSDaemonClient> client,
                    std::unique_ptr<StatusReporter> status);
 

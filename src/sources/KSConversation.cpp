@@ -8,31 +8,14 @@
 
 #include "core/KSAssertion.h"
 #include "model/Description.h"
+#include "sources/ArchiveErrors.h"
 #include "sources/ContactCoding.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSConversation";
 constexpr int kMissing = 2;
-constexpr int kUnexpectedClass = 3;
-
-std::string_view className(const KSValue& value) {
-    struct Namer {
-        std::string_view operator()(std::monostate) const { return "Null"; }
-        std::string_view operator()(bool) const { return "Boolean"; }
-        std::string_view operator()(std::int64_t) const { return "Integer"; }
-        std::string_view operator()(double) const { return "Number"; }
-        std::string_view operator()(const std::string&) const { return "String"; }
-        std::string_view operator()(const KSValue::Bytes&) const { return "Bytes"; }
-        std::string_view operator()(KSDate) const { return "Date"; }
-        std::string_view operator()(const KSUUID&) const { return "UUID"; }
-        std::string_view operator()(const KSArray&) const { return "Array"; }
-        std::string_view operator()(const KSDictionary&) const { return "Dictionary"; }
-    };
-    return value.visit(Namer());
-}
 
 KSError missing(std::string_view key) {
     return KSError::make(
@@ -40,12 +23,8 @@ KSError missing(std::string_view key) {
         fmt::format("Retrieved nil serialized value for nonnull KSConversation.{}", key));
 }
 
-KSError unexpectedClass(std::string_view key, std::string_view expected, std::string_view decoded) {
-    return KSError::make(
-        kKSConversationErrorDomain, kUnexpectedClass,
-        fmt::format("Unarchived unexpected class for KSConversation key \"{}\" (expected {}, "
-                    "decoded {})",
-                    key, expected, decoded));
+KSError conversationError(std::string_view key, std::string_view expected, const KSValue& decoded) {
+    return unexpectedClass(kKSConversationErrorDomain, "KSConversation", key, expected, decoded);
 }
 
 /// The archive's value under the key; null, with the error set, for one that is not of the class.
@@ -57,7 +36,7 @@ const KSValue* required(const KSDictionary& archive, std::string_view key,
         return nullptr;
     }
     if (className(value) != expected) {
-        error = unexpectedClass(key, expected, className(value));
+        error = conversationError(key, expected, value);
         return nullptr;
     }
     return &value;
@@ -148,7 +127,7 @@ KSConversation::Pointer KSConversation::initWithCoder(const KSDictionary& archiv
     if (const auto& value = valueForKey(archive, "scoredContact"); !value.isNull()) {
         const auto* dictionary = value.asDictionary();
         if (dictionary) contact = decodeContact(*dictionary);
-        if (!contact) error = unexpectedClass("scoredContact", "RankedContact", className(value));
+        if (!contact) error = conversationError("scoredContact", "RankedContact", value);
     }
     if (error) return nullptr;
     const auto* list = required(archive, "interactions", "Array", error);
@@ -158,7 +137,7 @@ KSConversation::Pointer KSConversation::initWithCoder(const KSDictionary& archiv
         const auto* dictionary = item.asDictionary();
         auto interaction = dictionary ? decodeInteraction(*dictionary) : std::nullopt;
         if (!interaction) {
-            error = unexpectedClass("interactions", "Interaction", className(item));
+            error = conversationError("interactions", "Interaction", item);
             return nullptr;
         }
         interactions.push_back(std::move(*interaction));

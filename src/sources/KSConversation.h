@@ -52,6 +52,8 @@ class KSConversation final {
     static Pointer initWithCoder(const KSDictionary& archive, OptionalError& error);
 
   private:
+    static constexpr std::string_view kUnit = "KSConversation";
+
     KSConversation(std::string contactIdentifier, std::optional<RankedContact> scoredContact,
                    Interactions interactions);
 

@@ -22,12 +22,6 @@
 
 namespace keepsakes {
 
-namespace {
-
-constexpr std::string_view kUnit = "KSForesightTravelManager";
-
-}  // namespace
-
 KSForesightTravelManager::KSForesightTravelManager(ProfileEventStore& profileStore,
                                                    std::shared_ptr<KSEventStore> keepsakeStore,
                                                    Clock& clock)

@@ -5,6 +5,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <vector>
 
@@ -55,6 +56,8 @@ class KSForesightTravelManager final : public KSService {
     void waitForQueueEmpty();
 
   private:
+    static constexpr std::string_view kUnit = "KSForesightTravelManager";
+
     KSForesightTravelManager(ProfileEventStore& profileStore,
                              std::shared_ptr<KSEventStore> keepsakeStore, Clock& clock);
 

@@ -9,6 +9,7 @@
 
 #include "core/KSAssertion.h"
 #include "model/Description.h"
+#include "sources/ArchiveErrors.h"
 
 namespace keepsakes {
 
@@ -46,23 +47,10 @@ constexpr auto kPlayTexts = std::to_array<PlayText>({
     {"artist", &KSMediaPlay::artist},
 });
 
-/// What a failed decoding says that it found.
-std::string_view className(const KSValue& value) {
-    if (value.isNull()) return "null";
-    if (value.asBool()) return "boolean";
-    if (value.asNumber()) return "number";
-    if (value.asString()) return "string";
-    if (value.asBytes()) return "data";
-    if (value.asDate()) return "date";
-    if (value.asUUID()) return "UUID";
-    return value.asDictionary() ? "dictionary" : "array";
-}
-
-KSError unexpectedClass(std::string_view key, std::string_view expected, const KSValue& value) {
-    return KSError::make(KSMediaPlayOCNTErrorDomain, 3,
-                         fmt::format("Unarchived unexpected class for KSMediaPlay key \"{}\" "
-                                     "(expected {}, decoded {})",
-                                     key, expected, className(value)));
+std::unexpected<KSError> playError(std::string_view key, std::string_view expected,
+                                   const KSValue& decoded) {
+    return std::unexpected(
+        unexpectedClass(KSMediaPlayOCNTErrorDomain, "KSMediaPlay", key, expected, decoded));
 }
 
 void encodeRecord(const NowPlayingRecord& record, KeyedEncoder& encoder) {
@@ -103,18 +91,18 @@ std::expected<KSMediaPlay, KSError> decodedPlay(const KSDictionary& archive) {
     for (const auto& [key, member] : kPlayTexts) {
         const auto& value = valueForKey(archive, key);
         if (value.isNull()) continue;
-        if (!value.asString()) return std::unexpected(unexpectedClass(key, "string", value));
+        if (!value.asString()) return playError(key, "String", value);
         play.*member = *value.asString();
     }
     if (const auto& product = valueForKey(archive, "productId"); !product.isNull()) {
         if (!product.asString() && !product.asNumber()) {
-            return std::unexpected(unexpectedClass("productId", "string or number", product));
+            return playError("productId", "String or Number", product);
         }
         play.productId = product;
     }
     if (const auto& sum = valueForKey(archive, "sumTimePlayed"); !sum.isNull()) {
         if (!sum.asNumber()) {
-            return std::unexpected(unexpectedClass("sumTimePlayed", "number", sum));
+            return playError("sumTimePlayed", "Number", sum);
         }
         play.sumTimePlayed = sum.asNumber();
     }
@@ -131,12 +119,12 @@ std::expected<KSMediaPlay, KSError> decodedPlay(const KSDictionary& archive) {
                           "Retrieved nil serialized value for nonnull KSMediaPlay.events"));
     }
     if (!events.asArray()) {
-        return std::unexpected(unexpectedClass("events", "array of now-playing records", events));
+        return playError("events", "Array of now-playing records", events);
     }
     for (const auto& item : *events.asArray()) {
         auto record = decodedRecord(item);
         if (!record) {
-            return std::unexpected(unexpectedClass("events", "now-playing record", item));
+            return playError("events", "now-playing record", item);
         }
         play.events.push_back(std::move(*record));
     }

@@ -20,7 +20,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSRoutineServiceManager";
 constexpr double kShortestVisit = 300;  // seconds
 constexpr std::uint64_t kDiscoveryNew = 1;
 constexpr std::uint64_t kDiscoveryKnown = 2;
@@ -193,8 +192,7 @@ void KSRoutineServiceManager::saveVisits(const Fetched& fetched, KSDate after,
         // A collection that began while the service hung asked for the same visits; of the two,
         // the one that is answered first stores them.
         const auto stored = startOfNewestVisit();
-        std::erase_if(*fresh,
-                      [stored](const auto& event) { return event->startDate() <= stored; });
+        std::erase_if(*fresh, [stored](const auto& event) { return event->startDate() <= stored; });
         if (fresh->empty()) {
             handler(std::nullopt, {});
         } else {

@@ -3,6 +3,7 @@
 
 #include <functional>
 #include <memory>
+#include <string_view>
 #include <vector>
 
 #include "core/KSError.h"
@@ -59,6 +60,8 @@ class KSRoutineServiceManager final : public KSService {
     static const RoutineVisit* findMatchingVisitFor(const KSEvent& event, const VisitArray& visits);
 
   private:
+    static constexpr std::string_view kUnit = "KSRoutineServiceManager";
+
     struct Fetched;
 
     KSRoutineServiceManager(RoutineService& routineManager, Clock& clock,

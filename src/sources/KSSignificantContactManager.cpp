@@ -25,8 +25,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSSignificantContactManager";
-
 std::optional<std::string> keyOf(const InteractionPerson& person) {
     return person.personId ? person.personId : person.identifier;
 }

@@ -5,6 +5,7 @@
 #include <map>
 #include <memory>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <vector>
 
@@ -68,6 +69,8 @@ class KSSignificantContactManager final : public KSService {
     void waitForQueueEmpty();
 
   private:
+    static constexpr std::string_view kUnit = "KSSignificantContactManager";
+
     KSSignificantContactManager(InteractionStore& interactionStore, ContactStore& contactStore,
                                 std::shared_ptr<KSEventStore> keepsakeStore, Clock& clock);
 

@@ -20,12 +20,6 @@
 
 namespace keepsakes {
 
-namespace {
-
-constexpr std::string_view kUnit = "KSSuggestedEventManager";
-
-}  // namespace
-
 KSSuggestedEventManager::KSSuggestedEventManager(ProfileEventStore& profileStore,
                                                  CalendarService& calendars,
                                                  std::shared_ptr<KSEventStore> keepsakeStore,

@@ -6,6 +6,7 @@
 #include <optional>
 #include <set>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <vector>
 
@@ -66,6 +67,8 @@ class KSSuggestedEventManager final : public KSService {
     void waitForQueueEmpty();
 
   private:
+    static constexpr std::string_view kUnit = "KSSuggestedEventManager";
+
     KSSuggestedEventManager(ProfileEventStore& profileStore, CalendarService& calendars,
                             std::shared_ptr<KSEventStore> keepsakeStore, Clock& clock);
 

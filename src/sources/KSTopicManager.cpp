@@ -8,6 +8,7 @@
 #include "core/Calendar.h"
 #include "core/Clock.h"
 #include "core/KSAssertion.h"
+#include "core/KSDate.h"
 #include "core/Log.h"
 #include "platform/PlatformServices.h"
 #include "sources/Lifetimes.h"
@@ -19,7 +20,6 @@ namespace {
 
 constexpr std::string_view kTopicMapping = "keepsakes-topics";
 constexpr double kDecayRate = 0.000001;
-constexpr double kDay = 86400;
 
 TopicQuery queryBetween(KSDate start, KSDate end) {
     return {.fromDate = start,

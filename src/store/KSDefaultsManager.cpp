@@ -11,12 +11,11 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSDefaultsManager";
 constexpr std::string_view kDomain = "com.brindle.keepsakesd";
 
 bool assertKey(const std::optional<std::string>& key, std::string_view method, int line) {
-    return assertParameter(key.has_value(), fmt::format("key (in {}:{})", method, line), kUnit,
-                           line);
+    return assertParameter(key.has_value(), fmt::format("key (in {}:{})", method, line),
+                           "KSDefaultsManager", line);
 }
 
 }  // namespace

@@ -4,6 +4,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 
 #include "core/KSValue.h"
 #include "core/ServiceLookup.h"

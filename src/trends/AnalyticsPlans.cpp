@@ -5,13 +5,13 @@
 #include <array>
 
 #include "core/Calendar.h"
+#include "core/KSDate.h"
 #include "model/KSExtensions.h"
 
 namespace keepsakes {
 
 namespace {
 
-constexpr double kDay = 86400;
 constexpr std::uint64_t kWorkPlace = 2;
 // Those that a person answers in person; the source of interactions knows one more.
 constexpr auto kMechanisms = std::to_array<std::int64_t>({0, 2, 3, 4, 8, 9, 10, 11, 12, 16});

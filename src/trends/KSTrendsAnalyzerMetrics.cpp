@@ -11,6 +11,7 @@
 #include "analytics/AnalyticsSubmission.h"
 #include "analytics/KSMetric.h"
 #include "core/Clock.h"
+#include "core/KSDate.h"
 #include "core/KSError.h"
 #include "core/Log.h"
 #include "model/KSExtensions.h"
@@ -26,7 +27,6 @@ namespace keepsakes {
 namespace {
 
 constexpr std::string_view kEvent = "com.brindle.Keepsakes.trends";
-constexpr double kDay = 86400;
 
 /// The value, its decimal scale and its two leading digits: 1234 has scale 3 and digits 12. Zero
 /// has neither scale nor digits, which stand as 0.

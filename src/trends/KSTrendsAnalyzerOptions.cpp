@@ -11,7 +11,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSTrendsAnalyzerOptions";
 constexpr double kLongEventSeconds = 600;
 
 double duration(const KSEvent& event) { return event.endDate() - event.startDate(); }

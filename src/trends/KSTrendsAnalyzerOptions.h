@@ -7,6 +7,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "model/KSEvent.h"
@@ -62,6 +63,8 @@ class KSTrendsAnalyzerOptions {
     std::string description() const;
 
   private:
+    static constexpr std::string_view kUnit = "KSTrendsAnalyzerOptions";
+
     KSTrendsAnalyzerOptions(std::string keyword, KSEventCategory category,
                             const KSDateInterval& trainDateInterval,
                             const KSDateInterval& testDateInterval,

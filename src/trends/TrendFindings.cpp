@@ -7,6 +7,7 @@
 #include <map>
 
 #include "core/Calendar.h"
+#include "core/KSDate.h"
 #include "model/KSExtensions.h"
 #include "trends/AnalyticsPlans.h"
 
@@ -14,7 +15,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr double kDay = 86400;
 constexpr std::size_t kFewestTrainingPoints = 3;
 
 /// The same clock time some calendar days later, or earlier.

@@ -14,6 +14,7 @@
 #include <system_error>
 
 #include "Introspection.h"
+#include "bus/BusHandles.h"
 #include "core/Log.h"
 #include "core/Text.h"
 #include "wire/BusListener.h"
@@ -35,8 +36,6 @@ constexpr std::chrono::seconds kLongestFinish{5};
 
 constexpr const char* kTooLarge =
     "the reply does not fit in one message; set a limit or ask for a shorter interval";
-
-std::string_view view(const char* text) { return text ? text : ""; }
 
 }  // namespace
 
@@ -194,8 +193,8 @@ int BusLoop::handle(sd_bus_message* message) {
     std::uint8_t type = 0;
     sd_bus_message_get_type(message, &type);
     if (type != SD_BUS_MESSAGE_METHOD_CALL) return 0;
-    const auto interface = view(sd_bus_message_get_interface(message));
-    const auto member = view(sd_bus_message_get_member(message));
+    const auto interface = bus::view(sd_bus_message_get_interface(message));
+    const auto member = bus::view(sd_bus_message_get_member(message));
 
     if (interface == "org.freedesktop.DBus.Introspectable" && member == "Introspect") {
         send(bus::Message(sd_bus_message_ref(message)), 0, {.body = [](sd_bus_message* out) {
@@ -211,7 +210,7 @@ int BusLoop::handle(sd_bus_message* message) {
     if (!interface.empty() && interface != bus::kConduitInterface) return 0;
     const auto* method = findConduitMethod(member);
     if (!method) return 0;
-    const auto signature = view(sd_bus_message_get_signature(message, 1));
+    const auto signature = bus::view(sd_bus_message_get_signature(message, 1));
     if (signature != method->signature) {
         sendError(message, bus::kInvalidArgs,
                   fmt::format("{} takes arguments of type \"{}\", not \"{}\"", method->name,

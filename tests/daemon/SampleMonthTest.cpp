@@ -44,8 +44,6 @@ using testing::IsSupersetOf;
 using testing::Pair;
 using testing::SizeIs;
 
-constexpr double kHour = 3600;
-constexpr double kDay = 24 * kHour;
 const std::filesystem::path kSample = KEEPSAKES_SAMPLE;
 
 /// For each rule a bundle that it forms in the month.

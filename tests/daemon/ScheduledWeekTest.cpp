@@ -19,7 +19,6 @@ using testing::ElementsAre;
 using testing::MatchesRegex;
 using testing::Pair;
 
-constexpr double kHour = 3600;
 constexpr const char* kDaemonEvent = "com.brindle.Keepsakes.Daemon";
 
 class ScheduledWeek : public testing::Test {

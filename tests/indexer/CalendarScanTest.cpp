@@ -23,8 +23,6 @@ using enum SuggestionCategory;
 
 KSDate at(const std::string& text) { return parseISO8601(text)->date; }
 
-const KSDate kNow = at("2024-06-15T12:00:00Z");
-
 class OwnerInVienna : public testing::Test {
   protected:
     static void SetUpTestSuite() {

@@ -17,12 +17,12 @@ using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
 
-const KSDate kNow = parseISO8601("2024-06-15T12:00:00Z")->date;
 const std::string kLinks = "com_brindle_parley_indexType=\"lnk\" && URL=* && ";
 const std::string kDates =
     "InRange(contentCreationDate, iso(2024-06-01T00:00:00Z), iso(2024-06-15T00:00:00Z))";
 
-std::string mail(int day, const std::string& from, const std::string& to, const std::string& text) {
+std::string linkMail(int day, const std::string& from, const std::string& to,
+                     const std::string& text) {
     return fmt::format(
         "From: {}\nTo: {}\nDate: {} Jun 2024 08:00:00 +0000\nMessage-ID: <{}@x>\n\n{}\n", from, to,
         day, day, text);
@@ -86,19 +86,21 @@ TEST_F(LinkScan, HighlightsWhatIsStarredAndWhatCameFromSomebodyClose) {
     for (int day = 1; day < 10; ++day) {
         const bool isSent = day % 2 == 0;
         folder_.write(fmt::format("Mail/{}cur/{}:2,S", isSent ? ".Sent/" : "", day),
-                      isSent ? mail(day, "me@x.org", "anna@x.org", "text")
-                             : mail(day, "anna@x.org", "me@x.org", "text"));
+                      isSent ? linkMail(day, "me@x.org", "anna@x.org", "text")
+                             : linkMail(day, "anna@x.org", "me@x.org", "text"));
     }
     folder_.write("Contacts/a.vcf",
                   "BEGIN:VCARD\nUID:anna\nFN:Anna\nEMAIL:anna@x.org\nEND:VCARD\n");
-    folder_.write("Mail/cur/10:2,S", mail(10, "anna@x.org", "me@x.org", "http://anna.org"));
-    folder_.write("Mail/cur/11:2,FS", mail(11, "bo@x.org", "me@x.org", "http://starred.org"));
-    folder_.write("Mail/cur/12:2,S", mail(12, "bo@x.org", "me@x.org", "http://bo.org"));
-    folder_.write("Mail/.Sent/cur/13:2,S", mail(13, "me@x.org", "anna@x.org", "http://mine.org"));
-    folder_.write("Mail/.Trash/cur/14:2,S", mail(14, "anna@x.org", "me@x.org", "http://gone.org"));
-    folder_.write("Mail/cur/14:2,ST", mail(14, "anna@x.org", "me@x.org", "http://gone.org"));
+    folder_.write("Mail/cur/10:2,S", linkMail(10, "anna@x.org", "me@x.org", "http://anna.org"));
+    folder_.write("Mail/cur/11:2,FS", linkMail(11, "bo@x.org", "me@x.org", "http://starred.org"));
+    folder_.write("Mail/cur/12:2,S", linkMail(12, "bo@x.org", "me@x.org", "http://bo.org"));
+    folder_.write("Mail/.Sent/cur/13:2,S",
+                  linkMail(13, "me@x.org", "anna@x.org", "http://mine.org"));
+    folder_.write("Mail/.Trash/cur/14:2,S",
+                  linkMail(14, "anna@x.org", "me@x.org", "http://gone.org"));
+    folder_.write("Mail/cur/14:2,ST", linkMail(14, "anna@x.org", "me@x.org", "http://gone.org"));
     folder_.write("Mail/copies.mbox", "From a Fri Jun 14 08:00:00 2024\n" +
-                                          mail(12, "bo@x.org", "me@x.org", "http://bo.org"));
+                                          linkMail(12, "bo@x.org", "me@x.org", "http://bo.org"));
     folder_.write("Mail/sms.xml",
                   "<smses><sms address='0660111222' date='1718323200500' type='1' locked='1'"
                   " body='http://sms.org'/></smses>");

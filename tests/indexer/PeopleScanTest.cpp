@@ -41,9 +41,6 @@ class CountingReader final : public FileReader {
     ContentReader reader_;
 };
 
-/// Noon of 2024-06-15; what the files tell lies in the days before.
-const KSDate kNow = parseISO8601("2024-06-15T12:00:00Z")->date;
-
 std::string mail(int number, const std::string& from, const std::string& to,
                  const std::string& fields = "") {
     return fmt::format(

@@ -11,6 +11,9 @@
 
 namespace keepsakes {
 
+/// Noon of 2024-06-15; what the files tell lies in the days before.
+inline const KSDate kNow = parseISO8601("2024-06-15T12:00:00Z")->date;
+
 /// What a scan told.
 struct ScanOutcome {
     ScanSummary summary;

@@ -10,6 +10,7 @@
 
 #include "ScanOnce.h"
 #include "TextReader.h"
+#include "core/KSDate.h"
 #include "devicedata/IndexedRoutineService.h"
 #include "support/TemporaryFolder.h"
 #include "support/VirtualClock.h"
@@ -21,8 +22,6 @@ namespace fs = std::filesystem;
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
-
-constexpr double kDay = 86400;
 
 class VisitScan : public testing::Test {
   protected:

@@ -15,7 +15,7 @@
 namespace keepsakes {
 namespace {
 
-constexpr double kDeadlineSeconds = 30;
+constexpr double kPowerDeadlineSeconds = 30;
 
 /// UPower, the adapter and the notifier that tells of it, on a real bus and a real clock.
 class UPower : public testing::Test {
@@ -50,7 +50,7 @@ class UPower : public testing::Test {
 
     /// What the notifier says next about the battery.
     std::string next() {
-        if (!clock.wait(hears, kDeadlineSeconds)) return "nothing";
+        if (!clock.wait(hears, kPowerDeadlineSeconds)) return "nothing";
         const std::lock_guard lock(mutex);
         auto line = std::move(heard.front());
         heard.pop_front();
@@ -60,7 +60,7 @@ class UPower : public testing::Test {
         const std::lock_guard lock(mutex);
         return heard.empty();
     }
-    bool externalPowerChanges() { return clock.wait(externalChanges, kDeadlineSeconds); }
+    bool externalPowerChanges() { return clock.wait(externalChanges, kPowerDeadlineSeconds); }
 
     void startUPower() {
         upower.start();
@@ -159,7 +159,7 @@ TEST_F(UPower, TheLastStateOutlivesTheService) {
     bus.start();
     EXPECT_EQ(next(), "50% Unknown (None) off, was off");
     upower.end();
-    ASSERT_TRUE(clock.wait(end.seen, kDeadlineSeconds));
+    ASSERT_TRUE(clock.wait(end.seen, kPowerDeadlineSeconds));
     WorkerThreads::shared().settle();
     EXPECT_TRUE(hearsNothing());
     EXPECT_FALSE(power.hasExternalPower());

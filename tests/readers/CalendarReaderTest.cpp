@@ -21,7 +21,9 @@ class CalendarReader : public testing::Test {
     }
 };
 
-std::string told(const std::string& lines) { return occurrencesIn(calendarOf(entryOf(lines))); }
+std::string toldEntry(const std::string& lines) {
+    return occurrencesIn(calendarOf(entryOf(lines)));
+}
 
 std::size_t countOf(const std::string& text) {
     return static_cast<std::size_t>(std::ranges::count(text, '\n'));
@@ -81,7 +83,7 @@ TEST_F(CalendarReader, KnowsWhenEntriesEnd) {
          "2024-06-10T10:00:00Z..2024-06-10T10:00:00Z"},
     };
     for (const auto& [what, lines, expected] : cases) {
-        EXPECT_EQ(told(lines), "u " + expected + " \n") << what;
+        EXPECT_EQ(toldEntry(lines), "u " + expected + " \n") << what;
     }
 }
 
@@ -93,14 +95,15 @@ TEST_F(CalendarReader, FollowsRecurrences) {
     const std::string second = "u/20240325T170000Z 2024-03-25T17:00:00Z..2024-03-25T18:00:00Z a\n";
     // Six o'clock is an hour earlier in summer.
     const std::string third = "u/20240401T160000Z 2024-04-01T16:00:00Z..2024-04-01T17:00:00Z a\n";
-    EXPECT_EQ(told(weekly), first + second + third);
-    EXPECT_EQ(told("SUMMARY:a\r\nDTSTART;TZID=Europe/Vienna:20240318T180000\r\nDURATION:PT1H\r\n"
-                   "RRULE:FREQ=WEEKLY;UNTIL=20240325T170000Z\r\n"),
-              first + second)
+    EXPECT_EQ(toldEntry(weekly), first + second + third);
+    EXPECT_EQ(
+        toldEntry("SUMMARY:a\r\nDTSTART;TZID=Europe/Vienna:20240318T180000\r\nDURATION:PT1H\r\n"
+                  "RRULE:FREQ=WEEKLY;UNTIL=20240325T170000Z\r\n"),
+        first + second)
         << "until the instant of the last";
-    EXPECT_EQ(told(weekly + "EXDATE;TZID=Europe/Vienna:20240325T180000\r\n"), first + third);
-    EXPECT_EQ(told(weekly + "EXDATE;VALUE=DATE:20240318,20240325\r\n"), third);
-    EXPECT_EQ(told(weekly + "RDATE;VALUE=PERIOD:20240402T100000Z/PT2H\r\n"),
+    EXPECT_EQ(toldEntry(weekly + "EXDATE;TZID=Europe/Vienna:20240325T180000\r\n"), first + third);
+    EXPECT_EQ(toldEntry(weekly + "EXDATE;VALUE=DATE:20240318,20240325\r\n"), third);
+    EXPECT_EQ(toldEntry(weekly + "RDATE;VALUE=PERIOD:20240402T100000Z/PT2H\r\n"),
               first + second + third +
                   "u/20240402T100000Z 2024-04-02T10:00:00Z..2024-04-02T12:00:00Z a\n");
     const auto with = [&](const std::string& lines) {
@@ -116,7 +119,7 @@ TEST_F(CalendarReader, FollowsRecurrences) {
                    "DTSTART:20240325T190000Z\r\n"),
               first + "u/20240325T170000Z 2024-03-25T19:00:00Z..2024-03-25T19:00:00Z b\n" +
                   "u/20240401T160000Z 2024-04-01T18:00:00Z..2024-04-01T18:00:00Z b\n");
-    EXPECT_EQ(told("DTSTART;VALUE=DATE:19900615\r\nRRULE:FREQ=YEARLY\r\nSUMMARY:a\r\n"),
+    EXPECT_EQ(toldEntry("DTSTART;VALUE=DATE:19900615\r\nRRULE:FREQ=YEARLY\r\nSUMMARY:a\r\n"),
               "u/20220615 2022-06-14T22:00:00Z..2022-06-15T22:00:00Z day a\n"
               "u/20230615 2023-06-14T22:00:00Z..2023-06-15T22:00:00Z day a\n"
               "u/20240615 2024-06-14T22:00:00Z..2024-06-15T22:00:00Z day a\n"
@@ -125,18 +128,19 @@ TEST_F(CalendarReader, FollowsRecurrences) {
 
 TEST_F(CalendarReader, BoundsWhatRecursForAges) {
     // Two years and more back, one and more ahead.
-    EXPECT_EQ(countOf(told("DTSTART:10240101T100000Z\r\nRRULE:FREQ=DAILY\r\n")), 1200u);
-    EXPECT_EQ(countOf(told("DTSTART:17240101T100000Z\r\nRRULE:FREQ=DAILY;COUNT=109630\r\n")), 690u)
+    EXPECT_EQ(countOf(toldEntry("DTSTART:10240101T100000Z\r\nRRULE:FREQ=DAILY\r\n")), 1200u);
+    EXPECT_EQ(countOf(toldEntry("DTSTART:17240101T100000Z\r\nRRULE:FREQ=DAILY;COUNT=109630\r\n")),
+              690u)
         << "it ends on 2024-02-26";
     for (const auto* rule :
          {"FREQ=SECONDLY", "FREQ=MINUTELY;BYMONTH=2;BYMONTHDAY=30", "FREQ=HOURLY"}) {
-        EXPECT_EQ(told(std::string("DTSTART:20240610T100000Z\r\nRRULE:") + rule + "\r\n"),
+        EXPECT_EQ(toldEntry(std::string("DTSTART:20240610T100000Z\r\nRRULE:") + rule + "\r\n"),
                   "u/20240610T100000Z 2024-06-10T10:00:00Z..2024-06-10T10:00:00Z \n"
                   "! left out: a rule by the hour or more often (1)\n");
     }
     for (const auto* rule : {"FREQ=YEARLY;BYMONTH=2;BYMONTHDAY=30", "FREQ=DAILY;INTERVAL=0",
                              "FREQ=WEEKLY;COUNT=-1", "nonsense"}) {
-        EXPECT_THAT(told(std::string("DTSTART:20240610T100000Z\r\nRRULE:") + rule + "\r\n"),
+        EXPECT_THAT(toldEntry(std::string("DTSTART:20240610T100000Z\r\nRRULE:") + rule + "\r\n"),
                     StartsWith("u/20240610T100000Z"))
             << rule;
     }
@@ -155,15 +159,15 @@ TEST_F(CalendarReader, BoundsWhatRecursForAges) {
 
 TEST_F(CalendarReader, LeavesOutWhatIsCancelledOrSaidAnew) {
     const std::string start = "DTSTART:20240610T100000Z\r\n";
-    EXPECT_EQ(told(start + "STATUS:CANCELLED\r\n"), "");
+    EXPECT_EQ(toldEntry(start + "STATUS:CANCELLED\r\n"), "");
     EXPECT_EQ(occurrencesIn(calendarOf("METHOD:CANCEL\r\n" + entryOf(start))), "");
     EXPECT_EQ(occurrencesIn(calendarOf(entryOf(start + "SEQUENCE:2\r\nSUMMARY:new\r\n") +
                                        entryOf(start + "SEQUENCE:1\r\nSUMMARY:old\r\n"))),
               "u 2024-06-10T10:00:00Z..2024-06-10T10:00:00Z new\n");
-    EXPECT_EQ(told("SUMMARY:a\r\n"), "! left out: no start that can be read (1)\n");
-    EXPECT_EQ(told("DTSTART:99990610T100000Z\r\n"),
+    EXPECT_EQ(toldEntry("SUMMARY:a\r\n"), "! left out: no start that can be read (1)\n");
+    EXPECT_EQ(toldEntry("DTSTART:99990610T100000Z\r\n"),
               "! left out: a date that is not believed (1)\n");
-    EXPECT_THAT(told("DTSTART:20241399T990000Z\r\n"), HasSubstr("no start"));
+    EXPECT_THAT(toldEntry("DTSTART:20241399T990000Z\r\n"), HasSubstr("no start"));
 }
 
 TEST_F(CalendarReader, ReadsWhatIsOddAndRefusesWhatIsCut) {
@@ -171,8 +175,8 @@ TEST_F(CalendarReader, ReadsWhatIsOddAndRefusesWhatIsCut) {
     const std::string expected = "u 2024-06-10T10:00:00Z..2024-06-10T10:00:00Z a, b\n";
     EXPECT_EQ(occurrencesIn(good), expected);
     EXPECT_EQ(occurrencesIn("\xEF\xBB\xBF" + good + good).find("error"), std::string::npos);
-    EXPECT_EQ(told("a broken line\r\nBEGIN:VALARM\r\nSUMMARY:no\r\nEND:VALARM\r\n"
-                   "DTSTART:20240610T100000Z\r\nSUMMARY:a\\, b\r\n"),
+    EXPECT_EQ(toldEntry("a broken line\r\nBEGIN:VALARM\r\nSUMMARY:no\r\nEND:VALARM\r\n"
+                        "DTSTART:20240610T100000Z\r\nSUMMARY:a\\, b\r\n"),
               expected);
     EXPECT_THAT(occurrencesIn("BEGIN:VCALENDAR\r\nEND:VEVENT\r\n"), StartsWith("error: "));
     for (std::size_t length = 0; length + 2 < good.size(); ++length) {

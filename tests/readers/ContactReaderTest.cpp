@@ -8,7 +8,7 @@
 namespace keepsakes {
 namespace {
 
-std::string told(const std::string& bytes) {
+std::string toldCards(const std::string& bytes) {
     PeopleText told;
     const auto done = readContacts(inPieces(bytes, 5), told);
     return done ? told.text : told.text + "error: " + done.error();
@@ -46,21 +46,22 @@ TEST(ContactReader, ReadsCardsOfEveryVersion) {
          "card , A: mailto:a@b\n"},
     };
     for (const auto& [what, lines, expected] : cases)
-        EXPECT_EQ(told(card(lines)), expected) << what;
-    EXPECT_EQ(told("\xEF\xBB\xBF" + card("FN:A\n") + "\n" + card("FN:B\n")),
+        EXPECT_EQ(toldCards(card(lines)), expected) << what;
+    EXPECT_EQ(toldCards("\xEF\xBB\xBF" + card("FN:A\n") + "\n" + card("FN:B\n")),
               "card , A: \ncard , B: \n");
 }
 
 TEST(ContactReader, RefusesAFileThatIsCut) {
     const auto bytes = card("FN:A\nEMAIL:a@b\n") + card("FN:B\n");
-    EXPECT_EQ(told(""), "error: it holds no card");
+    EXPECT_EQ(toldCards(""), "error: it holds no card");
     for (std::size_t length = 0; length < bytes.size() - 1; ++length) {
-        const auto cut = told(bytes.substr(0, length));
+        const auto cut = toldCards(bytes.substr(0, length));
         // Cut behind the first card, it is a file of one card.
         const bool isWhole = cut == "card , A: mailto:a@b\n";
         EXPECT_TRUE(isWhole || cut.find("error: ") != std::string::npos) << length << ": " << cut;
     }
-    EXPECT_EQ(told(bytes.substr(0, bytes.size() - 1)), told(bytes)) << "the last line end";
+    EXPECT_EQ(toldCards(bytes.substr(0, bytes.size() - 1)), toldCards(bytes))
+        << "the last line end";
 }
 
 }  // namespace

@@ -14,7 +14,7 @@ namespace keepsakes {
 namespace {
 
 /// "<url>[ | <title>[ | <description>]]" of each link, joined by blanks.
-std::string told(const LinkList& list) {
+std::string toldLinks(const LinkList& list) {
     std::string text;
     for (const auto& link : list.links()) {
         if (!text.empty()) text += ' ';
@@ -28,13 +28,13 @@ std::string told(const LinkList& list) {
 std::string inText(const std::string& text) {
     LinkList links;
     findLinks(text, links);
-    return told(links);
+    return toldLinks(links);
 }
 
 std::string inHtml(const std::string& html) {
     LinkList links;
     findHtmlLinks(html, links);
-    return told(links);
+    return toldLinks(links);
 }
 
 TEST(LinkFinder, TakesLinksOutOfSentences) {
@@ -82,22 +82,22 @@ TEST(LinkFinder, TakesTitlesFromTheTextOfHtmlLinks) {
     EXPECT_EQ(inHtml(deep), "http://x.org | x");
 }
 
-const std::string kHead =
+const std::string kLinkMail =
     "From: anna@x.org\nDate: Fri, 14 Jun 2024 08:00:00 +0200\nMIME-Version: 1.0\n";
-const std::string kAt = "0 -- 2024-06-14T06:00:00Z mailto:anna@x.org: \n";
+const std::string kMessage = "0 -- 2024-06-14T06:00:00Z mailto:anna@x.org: \n";
 
 /// What a mail of those lines behind its head tells beside itself, whether it stands alone or in a
 /// mailbox.
 std::string links(const std::string& lines) {
     PeopleText alone;
-    EXPECT_TRUE(readMail(inPieces(kHead + lines, 7), kReadOn, alone));
+    EXPECT_TRUE(readMail(inPieces(kLinkMail + lines, 7), kReadOn, alone));
     PeopleText boxed;
     const std::string separator = "From a Fri Jun 14 08:00:00 2024\n";
-    const auto box = separator + kHead + lines + "\n" + separator + kHead + "\n";
+    const auto box = separator + kLinkMail + lines + "\n" + separator + kLinkMail + "\n";
     EXPECT_TRUE(readMailbox(inPieces(box, 7), kReadOn, boxed));
-    EXPECT_EQ(boxed.text, alone.text + kAt);
-    EXPECT_TRUE(alone.text.starts_with(kAt)) << alone.text;
-    return alone.text.substr(std::min(kAt.size(), alone.text.size()));
+    EXPECT_EQ(boxed.text, alone.text + kMessage);
+    EXPECT_TRUE(alone.text.starts_with(kMessage)) << alone.text;
+    return alone.text.substr(std::min(kMessage.size(), alone.text.size()));
 }
 
 TEST(MailLinks, ComeFromTheTextPartsDecoded) {
@@ -127,7 +127,8 @@ TEST(MailLinks, ComeFromTheTextPartsDecoded) {
     for (const auto& [lines, told] : cases) EXPECT_EQ(links(lines), told) << lines.substr(0, 500);
     PeopleText deleted;
     EXPECT_TRUE(readMailbox(
-        inPieces("From a Fri Jun 14 08:00:00 2024\n" + kHead + "X-Status: D\n\nhttp://x.org\n", 7),
+        inPieces("From a Fri Jun 14 08:00:00 2024\n" + kLinkMail + "X-Status: D\n\nhttp://x.org\n",
+                 7),
         kReadOn, deleted));
     EXPECT_EQ(deleted.text, "");
 }

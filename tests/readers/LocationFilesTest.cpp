@@ -14,13 +14,13 @@ namespace {
 
 using testing::HasSubstr;
 
-struct Case {
+struct LocationCase {
     std::string what;
     std::string file;
     std::string told;
 };
 
-void check(const std::vector<Case>& cases) {
+void checkPlaces(const std::vector<LocationCase>& cases) {
     for (const auto& [what, file, expected] : cases) {
         EXPECT_EQ(toldPlaces(file), expected) << what;
         EXPECT_EQ(brokenCut(file), "") << what;
@@ -30,7 +30,7 @@ void check(const std::vector<Case>& cases) {
 std::string records(const std::string& inside) { return R"({"locations": [)" + inside + "]}"; }
 
 TEST(LocationHistoryReader, ReadsRawRecords) {
-    check({
+    checkPlaces({
         {"times as text and in milliseconds, one within a guess of the activity",
          records(R"({"latitudeE7": 525121303, "longitudeE7": 134309551, "accuracy": 25,
                      "activity": [{"activity": [{"type": "STILL"}],
@@ -56,7 +56,7 @@ TEST(LocationHistoryReader, ReadsRawRecords) {
 }
 
 TEST(LocationHistoryReader, ReadsStaysAndWaysOfTheSemanticForm) {
-    check({
+    checkPlaces({
         {"a stay at home with a stay within and its raw path", R"({"timelineObjects": [
              {"placeVisit": {
                  "location": {"latitudeE7": 470000000, "longitudeE7": 155000000,
@@ -102,7 +102,7 @@ TEST(LocationHistoryReader, ReadsStaysAndWaysOfTheSemanticForm) {
 }
 
 TEST(LocationHistoryReader, ReadsWhatADeviceExports) {
-    check({
+    checkPlaces({
         {"segments, signals and labelled places", R"({"semanticSegments": [
              {"visit": {"hierarchyLevel": 0, "probability": 0.75, "topCandidate": {
                   "probability": 0.1, "semanticType": "INFERRED_WORK",
@@ -150,7 +150,7 @@ TEST(GeoJsonReader, ReadsPointsWithATimeAndPlacesWithAName) {
         return R"({"type": "Feature", "properties": {)" + properties +
                R"(}, "geometry": {"type": "Point", "coordinates": [15.5, 47, 350]}})";
     };
-    check({
+    checkPlaces({
         {"points",
          R"({"type": "FeatureCollection", "features": [)" +
              point(R"("time": "2024-06-15T08:00:00Z", "accuracy": 5, "name": "x")") + "," +
@@ -191,7 +191,7 @@ TEST(OwnTracksReader, ReadsLocationsAndWaypoints) {
         time + R"({"_type":"location","tst":1718438400,"lat":47.0,"lon":15.5,"acc":8})"
                "\n";
     const std::string told = "2024-06-15T08:00:00Z 47.0000 15.5000 8 m\n";
-    check({
+    checkPlaces({
         {"locations, transitions and waypoints; the recorder's time where there is no other",
          point + time + R"({"lat":47.1,"_type":"transition","lon":15.5})" + "\r\n" + time +
              R"({"_type":"waypoint","desc":"Büro","lat":47.2,"lon":15.5,"tst":1})" + "\n" +

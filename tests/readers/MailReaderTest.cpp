@@ -28,7 +28,7 @@ std::string mailbox(const std::string& bytes) {
     return done ? told.text : told.text + "error: " + done.error();
 }
 
-struct Case {
+struct MailCase {
     std::string what;
     std::string fields;
     std::string told;
@@ -36,7 +36,7 @@ struct Case {
 
 TEST(MailReader, TellsWhoWroteToWhom) {
     const std::string at = " -- 2024-06-14T06:00:00Z mailto:anna@x.org: ";
-    const std::vector<Case> cases{
+    const std::vector<MailCase> cases{
         {"names, comments, quotes, groups and routes",
          "To: \"Doe, \\\"B.\\\" <a@b>\" <Bo@X.org>, c@x.org (C, or so),\n\t<@one,@two:d@x.org>\n"
          "cc: friends: e@x.org, c@x.org;, not an address, <>\n",

@@ -14,7 +14,7 @@ namespace {
 
 using testing::HasSubstr;
 
-std::string told(const std::string& bytes, std::size_t pieces = 3) {
+std::string toldBackup(const std::string& bytes, std::size_t pieces = 3) {
     PeopleText told;
     const auto done = readMessageBackup(inPieces(bytes, pieces), kReadOn, told);
     return done ? told.text : "error: " + done.error();
@@ -22,43 +22,43 @@ std::string told(const std::string& bytes, std::size_t pieces = 3) {
 
 // 2024-06-14T06:00:00Z
 const std::string kDate = " date='1718344800000' ";
-const std::string kAt = "2024-06-14T06:00:00Z ";
+const std::string kWhen = "2024-06-14T06:00:00Z ";
 
 TEST(MessageBackup, TellsMessagesAndCalls) {
     const std::vector<std::tuple<std::string, std::string, std::string>> cases{
         {"received", "<sms address='+43 660 555 12 34' type='1' contact_name='Anna'/>",
-         "card , Anna: tel:605551234\n2 <- " + kAt + "tel:605551234: \n"},
+         "card , Anna: tel:605551234\n2 <- " + kWhen + "tel:605551234: \n"},
         {"sent, with a text that no parser takes",
          "<sms address='06605551234' type='2' body='&#55357;&#56832; &lt;\" &bad;' text='a&'"
          " contact_name='(Unknown)'/>",
-         "2 -> " + kAt + ": tel:605551234\n"},
+         "2 -> " + kWhen + ": tel:605551234\n"},
         {"half a character in a name",
          "<sms address='06605551234' type='1' contact_name="
          "'Anna &#55357;&#x1F600;&#56832;&amp; B'/>",
-         "card , Anna 😀& B: tel:605551234\n2 <- " + kAt + "tel:605551234: \n"},
-        {"a draft", "<sms address='06605551234' type='3'/>", "6 -> " + kAt + ": tel:605551234\n"},
+         "card , Anna 😀& B: tel:605551234\n2 <- " + kWhen + "tel:605551234: \n"},
+        {"a draft", "<sms address='06605551234' type='3'/>", "6 -> " + kWhen + ": tel:605551234\n"},
         {"services", "<sms address='Vodafone' type='1'/><sms address='12345' type='1'/>",
-         "7 <- " + kAt + ": \n7 <- " + kAt + "code:12345: \n"},
+         "7 <- " + kWhen + ": \n7 <- " + kWhen + "code:12345: \n"},
         {"a group",
          "<mms msg_box='1' address='111111111~222222222' contact_name='A, B'><parts><part data='"
          "<>/' /></parts><addrs><addr address='111111111' type='137'/><addr address='333333333'"
          " type='151'/><addr address='222222222' type='151'/></addrs></mms>",
-         "10 <- " + kAt + "tel:111111111: tel:333333333 tel:222222222\n"},
+         "10 <- " + kWhen + "tel:111111111: tel:333333333 tel:222222222\n"},
         {"sent by a number that is then the owner's",
          "<mms msg_box='2' address='111111111'><addrs><addr address='333333333' type='137'/>"
          "<addr address='111111111' type='151'/></addrs></mms>",
-         "owner tel:333333333\n3 -> " + kAt + ": tel:111111111\n"},
+         "owner tel:333333333\n3 -> " + kWhen + ": tel:111111111\n"},
         {"without addresses of its own",
          "<mms msg_box='1' address='111111111' tr_id='proto:x'><addrs><addr address="
          "'insert-address-token' type='151'/></addrs></mms>",
-         "17 <- " + kAt + "tel:111111111: \n"},
+         "17 <- " + kWhen + "tel:111111111: \n"},
         {"calls: answered, not answered, missed, withheld, of no kind",
          "<call number='111111111' type='1' duration='90'/><call number='111111111' type='2'"
          " duration='0'/><call number='111111111' type='3'/><call number='' type='1'"
          " duration='1e9'/><call number='111111111' type='99'/>",
          "4 <- 2024-06-14T06:00:00Z..2024-06-14T06:01:30Z tel:111111111: \n"
          "5 -> " +
-             kAt + ": tel:111111111\n5 <- " + kAt +
+             kWhen + ": tel:111111111\n5 <- " + kWhen +
              "tel:111111111: \n"
              "4 <- 2024-06-14T06:00:00Z..2024-06-15T06:00:00Z : \n"},
     };
@@ -69,13 +69,14 @@ TEST(MessageBackup, TellsMessagesAndCalls) {
                 elements.insert(at + name.size(), kDate);
             }
         }
-        EXPECT_EQ(told("<?xml version='1.0'?><!-- it's \" --><smses>" + elements + "</smses>"),
-                  expected)
+        EXPECT_EQ(
+            toldBackup("<?xml version='1.0'?><!-- it's \" --><smses>" + elements + "</smses>"),
+            expected)
             << what;
     }
     const auto picture = "<smses><sms address='111111111' type='1'" + kDate + "body=\"" +
                          std::string(3000000, 'A') + "\"/></smses>";
-    EXPECT_EQ(told(picture, 100000), "2 <- " + kAt + "tel:111111111: \n");
+    EXPECT_EQ(toldBackup(picture, 100000), "2 <- " + kWhen + "tel:111111111: \n");
 }
 
 TEST(MessageBackup, IsRefusedWithTheReason) {
@@ -87,11 +88,12 @@ TEST(MessageBackup, IsRefusedWithTheReason) {
          "no date in it is believed"},
         {"<smses><sms body='unending", "unclosed token"},
     };
-    for (const auto& [bytes, reason] : cases) EXPECT_THAT(told(bytes), HasSubstr(reason)) << bytes;
-    EXPECT_EQ(told("<smses count='0'/>"), "");
+    for (const auto& [bytes, reason] : cases)
+        EXPECT_THAT(toldBackup(bytes), HasSubstr(reason)) << bytes;
+    EXPECT_EQ(toldBackup("<smses count='0'/>"), "");
     const auto whole = "<smses><sms address='111111111' type='1'" + kDate + "/></smses>";
     for (std::size_t length = 0; length < whole.size(); ++length) {
-        EXPECT_THAT(told(whole.substr(0, length)), HasSubstr("error: ")) << length;
+        EXPECT_THAT(toldBackup(whole.substr(0, length)), HasSubstr("error: ")) << length;
     }
 }
 

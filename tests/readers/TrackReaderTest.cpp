@@ -31,13 +31,13 @@ std::string track(const std::string& type, const std::string& points) {
 const std::string kTwoPoints = point("2024-06-15T08:00:00Z") + point("2024-06-15T09:00:00Z");
 const std::string kHike = "Hiking 2024-06-15T08:00:00Z 2024-06-15T09:00:00Z\n";
 
-struct Case {
+struct TrackCase {
     std::string what;
     std::string file;
     std::string told;
 };
 
-void check(const std::vector<Case>& cases) {
+void checkTracks(const std::vector<TrackCase>& cases) {
     for (const auto& [what, file, expected] : cases) {
         EXPECT_EQ(told(readBytes(file)), expected) << what;
     }
@@ -68,7 +68,7 @@ TEST(TrackReader, HandsOnPointsAndTheOwnersWaypoints) {
 }
 
 TEST(TrackReader, ReadsOneWorkoutForEachTrackOfAGpxFile) {
-    check({
+    checkTracks({
         {"1.0 with a namespace and a prefix",
          "<?xml version='1.0'?><!-- <x> --><g:gpx version='1.0' "
          "xmlns:g='http://www.topografix.com/GPX/1/0'><g:trk><g:type>hiking</g:type><g:trkseg>"
@@ -107,16 +107,17 @@ TEST(TrackReader, ReadsOneWorkoutForEachTrackOfAGpxFile) {
         wide += c;
         wide += '\0';
     }
-    check({{"UTF-16", wide, kHike}});
+    checkTracks({{"UTF-16", wide, kHike}});
 }
 
 TEST(TrackReader, TellsTheZoneOfTimestampsThatNameOne) {
-    check({{"seven hours, in a taxi, then home and UTC",
-            gpx(track("taxi",
-                      point("2024-06-15T15:00:00+07:00") + point("2024-06-15T16:00:00+07:00") +
-                          point("2024-06-15T11:30:00+02:00") + point("2024-06-15T10:00:00Z"))),
-            "zone 25200 2024-06-15T08:00:00Z 2024-06-15T09:00:00Z\n"
-            "zone 7200 2024-06-15T09:30:00Z 2024-06-15T09:30:00Z\n"}});
+    checkTracks(
+        {{"seven hours, in a taxi, then home and UTC",
+          gpx(track("taxi",
+                    point("2024-06-15T15:00:00+07:00") + point("2024-06-15T16:00:00+07:00") +
+                        point("2024-06-15T11:30:00+02:00") + point("2024-06-15T10:00:00Z"))),
+          "zone 25200 2024-06-15T08:00:00Z 2024-06-15T09:00:00Z\n"
+          "zone 7200 2024-06-15T09:30:00Z 2024-06-15T09:30:00Z\n"}});
 }
 
 TEST(TrackReader, ReadsActivitiesOfATcxFile) {
@@ -127,7 +128,7 @@ TEST(TrackReader, ReadsActivitiesOfATcxFile) {
     const std::string laps =
         "<Lap StartTime='2024-06-12T16:00:00Z'><TotalTimeSeconds>600</TotalTimeSeconds></Lap>"
         "<Lap StartTime='2024-06-12T16:10:00Z'><TotalTimeSeconds>300.5</TotalTimeSeconds></Lap>";
-    check({
+    checkTracks({
         {"by its points", tcx("<Activity Sport='Running'>" + points + "</Activity>"),
          "Running 2024-06-12T16:00:02Z 2024-06-12T16:30:00Z\n"},
         {"by its laps, and without any speed",
@@ -162,7 +163,7 @@ std::string moving(double speed, double share = 1) {
 
 TEST(TrackReader, TellsTheActivityFromSpeedWhereNoTypeDoes) {
     const std::string span = " 2024-06-13T10:00:00Z 2024-06-13T10:59:50Z\n";
-    check({
+    checkTracks({
         {"walk", gpx("<trk><trkseg>" + moving(1.5) + "</trkseg></trk>"), "Walking" + span},
         {"a walk with rests", gpx(track("", moving(1.5, 0.3))), "Walking" + span},
         {"run", gpx(track("Other", moving(3))), "Running" + span},

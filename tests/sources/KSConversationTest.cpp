@@ -9,7 +9,7 @@
 namespace keepsakes {
 namespace {
 
-const RankedContact kAnna{.identifier = "CN:anna", .name = "Anna", .score = 0.75};
+const RankedContact kRankedAnna{.identifier = "CN:anna", .name = "Anna", .score = 0.75};
 const Interaction kMessage{.uuid = "u1",
                            .startDate = {100},
                            .endDate = {101.5},
@@ -19,12 +19,13 @@ const Interaction kMessage{.uuid = "u1",
                            .recipients = {{std::nullopt, "OWNER"}, {}}};
 
 KSConversation::Pointer conversation() {
-    return KSConversation::conversationWithContactIdentifier("OWNER_anna", kAnna, {{kMessage}});
+    return KSConversation::conversationWithContactIdentifier("OWNER_anna", kRankedAnna,
+                                                             {{kMessage}});
 }
 
 TEST(KSConversation, NeedsIdentifierAndInteractions) {
     RecordedAssertions assertions;
-    EXPECT_EQ(KSConversation::initWithContactIdentifier(std::nullopt, kAnna, {{kMessage}}),
+    EXPECT_EQ(KSConversation::initWithContactIdentifier(std::nullopt, kRankedAnna, {{kMessage}}),
               nullptr);
     EXPECT_EQ(conversation()->copyWithReplacementInteractions(std::nullopt), nullptr);
     EXPECT_THAT(assertions.takeDescriptions(),

@@ -63,16 +63,16 @@ TEST(KSMediaPlay, SaysWhatIsWrongWithAnArchive) {
         return "3 Unarchived unexpected class for KSMediaPlay key \"" + key + "\" (" + classes +
                ")";
     };
-    EXPECT_EQ(broken("title", 7), unexpected("title", "expected string, decoded number"));
-    EXPECT_EQ(broken("artist", KSArray()), unexpected("artist", "expected string, decoded array"));
+    EXPECT_EQ(broken("title", 7), unexpected("title", "expected String, decoded Integer"));
+    EXPECT_EQ(broken("artist", KSArray()), unexpected("artist", "expected String, decoded Array"));
     EXPECT_EQ(broken("productId", true),
-              unexpected("productId", "expected string or number, decoded boolean"));
+              unexpected("productId", "expected String or Number, decoded Boolean"));
     EXPECT_EQ(broken("sumTimePlayed", "long"),
-              unexpected("sumTimePlayed", "expected number, decoded string"));
+              unexpected("sumTimePlayed", "expected Number, decoded String"));
     EXPECT_EQ(broken("events", KSArray{1}),
-              unexpected("events", "expected now-playing record, decoded number"));
+              unexpected("events", "expected now-playing record, decoded Integer"));
     EXPECT_EQ(broken("events", KSArray{KSDictionary{{"title", "no state"}}}),
-              unexpected("events", "expected now-playing record, decoded dictionary"));
+              unexpected("events", "expected now-playing record, decoded Dictionary"));
 }
 
 TEST(KSMediaPlay, ReplacesOneFieldAtATime) {

@@ -13,12 +13,6 @@
 
 namespace keepsakes {
 
-namespace {
-
-constexpr std::string_view kUnit = "KSEventComputeScheduler";
-
-}  // namespace
-
 KSEventComputeScheduler::KSEventComputeScheduler(
     const PlatformServices& platform, std::shared_ptr<KSEventManager> eventManager,
     std::shared_ptr<KSEventBundleManager> eventBundleManager, bool computeEnabled)

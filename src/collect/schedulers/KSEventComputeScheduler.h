@@ -36,6 +36,8 @@ class KSEventComputeScheduler final : public KSService {
     std::vector<std::string> diagnosticLines() const override;
 
   private:
+    static constexpr std::string_view kUnit = "KSEventComputeScheduler";
+
     KSEventComputeScheduler(const PlatformServices& platform,
                             std::shared_ptr<KSEventManager> eventManager,
                             std::shared_ptr<KSEventBundleManager> eventBundleManager,

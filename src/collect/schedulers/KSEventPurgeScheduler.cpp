@@ -21,8 +21,6 @@ namespace keepsakes {
 
 namespace {
 
-constexpr std::string_view kUnit = "KSEventPurgeScheduler";
-
 /// The one result of the two clean-ups, whichever thread they end on.
 struct MergedResult {
     std::mutex mutex;

@@ -35,6 +35,8 @@ class KSEventPurgeScheduler final : public KSService {
     std::vector<std::string> diagnosticLines() const override;
 
   private:
+    static constexpr std::string_view kUnit = "KSEventPurgeScheduler";
+
     KSEventPurgeScheduler(const PlatformServices& platform,
                           std::shared_ptr<KSEventManager> eventManager,
                           std::shared_ptr<KSEventBundleManager> eventBundleManager,
