@@ -16,7 +16,7 @@ for script in scripts/*.sh .ci/run; do bash -n "$script"; done
 
 mkdir -p build/lint
 log=build/lint/tidy.log
-cmake --preset dev -DKEEPSAKES_TESTS=OFF -B build/lint >"$log" 2>&1 || { cat "$log" >&2; exit 1; }
+cmake --preset dev -DKEEPSAKES_TESTS=OFF -DCMAKE_UNITY_BUILD=OFF -B build/lint >"$log" 2>&1 || { cat "$log" >&2; exit 1; }
 folders=("$@")
 [ ${#folders[@]} -gt 0 ] || folders=(src)
 patterns=()

@@ -23,7 +23,7 @@ case $preset in
         ;;
 esac
 
-scripts/install-dependencies.sh build test
+scripts/install-dependencies.sh build test lint
 build "$preset"
 # Everything takes several times as long here.
 run_tests "$preset" --timeout 300 "$@"

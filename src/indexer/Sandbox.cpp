@@ -22,7 +22,7 @@ namespace keepsakes {
 namespace {
 
 // The sanitizers map terabytes and start threads of their own.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#ifdef KEEPSAKES_SANITIZED
 constexpr bool kCanConfine = false;
 #else
 constexpr bool kCanConfine = true;
@@ -188,15 +188,15 @@ void confineCalls() {
     for (const int call : kAllowed) (void)!seccomp_rule_add(filter, SCMP_ACT_ALLOW, call, 0);
     // To itself alone: `abort` and `raise` end a process that is broken.
     const auto self = static_cast<scmp_datum_t>(::getpid());
-    for (const int call : {SCMP_SYS(kill), SCMP_SYS(tgkill)}) {
-        if (failed == 0) {
-            failed = seccomp_rule_add(filter, SCMP_ACT_ALLOW, call, 1, SCMP_A0(SCMP_CMP_EQ, self));
-        }
-    }
+    const scmp_arg_cmp itself{.arg = 0, .op = SCMP_CMP_EQ, .datum_a = self, .datum_b = 0};
     // Asking for limits, not setting them.
-    if (failed == 0) {
-        failed = seccomp_rule_add(filter, SCMP_ACT_ALLOW, SCMP_SYS(prlimit64), 1,
-                                  SCMP_A2(SCMP_CMP_EQ, 0));
+    const scmp_arg_cmp nothing{.arg = 2, .op = SCMP_CMP_EQ, .datum_a = 0, .datum_b = 0};
+    for (const auto& [call, argument] :
+         {std::pair(SCMP_SYS(kill), itself), std::pair(SCMP_SYS(tgkill), itself),
+          std::pair(SCMP_SYS(prlimit64), nothing)}) {
+        if (failed == 0) {
+            failed = seccomp_rule_add_array(filter, SCMP_ACT_ALLOW, call, 1, &argument);
+        }
     }
     if (failed == 0) failed = seccomp_load(filter);
     seccomp_release(filter);

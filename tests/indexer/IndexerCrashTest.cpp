@@ -18,7 +18,7 @@ using testing::HasSubstr;
 using testing::UnorderedElementsAre;
 
 // The sanitizers want what the sandbox takes away, so that the indexer then runs without one.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#ifdef KEEPSAKES_SANITIZED
 constexpr bool kIsConfined = false;
 #else
 constexpr bool kIsConfined = true;
