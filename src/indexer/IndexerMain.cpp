@@ -4,8 +4,8 @@
 #include <fmt/format.h>
 #include <sys/stat.h>
 #include <unistd.h>
-#include <algorithm>
 
+#include <algorithm>
 #include <charconv>
 #include <chrono>
 #include <expected>

@@ -15,7 +15,7 @@ namespace keepsakes {
 namespace {
 
 bool isAlphanumeric(char c) {
-    return (c >= '0' && c <= '9') || (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z');
+    return isDigit(c) || (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z');
 }
 
 /// ASCII that stands in no URL as it is (RFC 3986, 2).
@@ -78,6 +78,16 @@ std::size_t linkLength(std::string_view text) {
     return end;
 }
 
+/// Without the number of a footnote, "[12]", that stands at the end of a path.
+std::string_view withoutFootnote(std::string_view link) {
+    const auto open = link.rfind('[');
+    if (open == std::string_view::npos || !link.ends_with(']')) return link;
+    const auto number = link.substr(open + 1, link.size() - open - 2);
+    const bool isFootnote = !number.empty() && std::ranges::all_of(number, isDigit) &&
+                            !link.substr(0, open).contains('?');
+    return isFootnote ? link.substr(0, open) : link;
+}
+
 std::string_view withoutPunctuation(std::string_view link) {
     struct Bracket {
         char close;
@@ -92,7 +102,7 @@ std::string_view withoutPunctuation(std::string_view link) {
         if (!isUnopened && !std::string_view(".,;:!?'*~").contains(link.back())) break;
         link.remove_suffix(1);
     }
-    return link;
+    return withoutFootnote(link);
 }
 
 }  // namespace

@@ -41,6 +41,8 @@ TEST(LinkFinder, TakesLinksOutOfSentences) {
     const std::vector<std::pair<std::string, std::string>> cases{
         {"see https://x.org/a, or http://y.org.", "https://x.org/a http://y.org"},
         {"(https://x.org/a_(b)) [http://y.org]", "https://x.org/a_(b) http://y.org"},
+        {"http://x.org/a[1], http://y.org[12]. http://z.org/?k[1]",
+         "http://x.org/a http://y.org http://z.org/?k[1]"},
         {"<https://x.org?a=1&b=2#c> \"http://y.org/'\"", "https://x.org?a=1&b=2#c http://y.org/"},
         {"HTTPS://X.Org/Path and again https://x.org/Path", "https://x.org/Path"},
         {"https://x.org/k\xC3\xA4se\xE2\x80\x9D", "https://x.org/k%C3%A4se"},
