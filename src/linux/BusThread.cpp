@@ -30,6 +30,8 @@ namespace keepsakes {
 
 namespace {
 
+constexpr std::string_view kFollowerFailed = "bus: a follower failed";
+
 constexpr double kFirstRetrySeconds = 1;
 constexpr double kLongestRetrySeconds = 3600;
 
@@ -178,7 +180,7 @@ void BusThread::Loop::connect() {
         return;
     }
     for (const auto& following : followings_) {
-        guarded("bus: a follower failed", [&following] { following.follower->becameAvailable(); });
+        guarded(kFollowerFailed, [&following] { following.follower->becameAvailable(); });
     }
 }
 
@@ -223,8 +225,7 @@ void BusThread::Loop::lose(int result) {
     for (auto& following : followings_) {
         following.owner.reset();
         following.signals.reset();
-        guarded("bus: a follower failed",
-                [&following] { following.follower->becameUnavailable(); });
+        guarded(kFollowerFailed, [&following] { following.follower->becameUnavailable(); });
     }
     connection_.reset();
     if (!waitsForSocket(result)) tryLater();
@@ -322,7 +323,7 @@ int BusThread::Loop::onOwnerChanged(sd_bus_message* message, void* following, sd
     const char* before = nullptr;
     const char* owner = nullptr;
     if (sd_bus_message_read(message, "sss", &name, &before, &owner) < 0) return 0;
-    guarded("bus: a follower failed", [&follower, owner] {
+    guarded(kFollowerFailed, [&follower, owner] {
         if (*owner) {
             follower.becameAvailable();
         } else {
@@ -333,7 +334,7 @@ int BusThread::Loop::onOwnerChanged(sd_bus_message* message, void* following, sd
 }
 
 int BusThread::Loop::onSignal(sd_bus_message* message, void* following, sd_bus_error*) {
-    guarded("bus: a follower failed", [message, following] {
+    guarded(kFollowerFailed, [message, following] {
         static_cast<Following*>(following)->follower->received(message);
     });
     return 0;
@@ -345,7 +346,7 @@ int BusThread::Loop::onReply(sd_bus_message* message, void* pending, sd_bus_erro
     std::list<PendingCall> answered;
     answered.splice(answered.begin(), call.loop->pending_, call.self);
     const auto reply = replyOf(message);
-    guarded("bus: a follower failed", [&call, &reply] { call.handler(reply); });
+    guarded(kFollowerFailed, [&call, &reply] { call.handler(reply); });
     return 0;
 }
 

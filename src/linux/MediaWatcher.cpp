@@ -125,8 +125,6 @@ class MediaWatcher::Loop {
     bool full_ = false;  ///< There are players that are not listened to.
 };
 
-namespace {}  // namespace
-
 template <void (MediaWatcher::Loop::*Method)(sd_bus_message*)>
 int MediaWatcher::Loop::handler(sd_bus_message* message, void* loop, sd_bus_error*) {
     return guarded("media", [&] { (static_cast<Loop*>(loop)->*Method)(message); });
