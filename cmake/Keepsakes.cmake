@@ -42,7 +42,7 @@ target_compile_options(keepsakes_options INTERFACE
     # GCC 12's library marks a function that its own stable_sort calls.
     $<$<CXX_COMPILER_ID:Clang>:-Wno-deprecated-declarations>
     # Takes a file that is compiled together with others for a header.
-    $<$<CXX_COMPILER_ID:GNU>:-Wno-subobject-linkage>)
+    $<$<AND:$<CXX_COMPILER_ID:GNU>,$<BOOL:${CMAKE_UNITY_BUILD}>>:-Wno-subobject-linkage>)
 
 # keepsakes_library(<folder> [SOURCES ...] [DEPS <folder>...] [PUBLIC ...] [PRIVATE ...])
 #
