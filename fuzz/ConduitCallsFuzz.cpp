@@ -140,7 +140,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     static constexpr auto kNames =
         std::to_array<std::string_view>({"StoreEvents", "AnalyzeTrendsInEvents",
                                          "FetchEventsWithOptions", "FetchEventBundlesWithOptions"});
-    Choices choices({data, size});
+    Choices choices(data, size);
     const auto* method = findConduitMethod(kNames[choices.of(kNames.size())]);
     check(method != nullptr, "the method is there");
     const auto message = newCall(*method);

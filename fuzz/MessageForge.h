@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <fuzzer/FuzzedDataProvider.h>
+
 #include <algorithm>
 #include <array>
 #include <cstdint>
-#include <cstring>
 #include <limits>
-#include <span>
 #include <string>
 #include <string_view>
 
@@ -16,36 +16,23 @@
 
 namespace keepsakes {
 
-/// The bytes of an input, by which a message is chosen one decision at a time; zeros at the end.
+/// An input as the decisions by which a message is chosen, one at a time; zeros at the end.
 class Choices {
   public:
-    explicit Choices(std::span<const std::uint8_t> bytes) : bytes_(bytes) {}
+    Choices(const std::uint8_t* data, std::size_t size) : bytes_(data, size) {}
 
-    unsigned of(unsigned count) {
-        if (bytes_.empty()) return 0;
-        const unsigned chosen = bytes_.front();
-        bytes_ = bytes_.subspan(1);
-        return chosen % count;
+    unsigned of(std::size_t count) {
+        return bytes_.ConsumeIntegralInRange(0U, static_cast<unsigned>(count) - 1);
     }
-    std::uint64_t word() {
-        std::array<std::uint8_t, 8> bytes{};
-        const auto taken = bytes_.first(std::min(bytes.size(), bytes_.size()));
-        std::ranges::copy(taken, bytes.begin());
-        bytes_ = bytes_.subspan(taken.size());
-        std::uint64_t word = 0;
-        std::memcpy(&word, bytes.data(), sizeof word);
-        return word;
-    }
+    std::uint64_t word() { return bytes_.ConsumeIntegral<std::uint64_t>(); }
     std::string text() {
-        const auto taken = bytes_.first(std::min<std::size_t>(of(16), bytes_.size()));
-        bytes_ = bytes_.subspan(taken.size());
-        std::string text(taken.begin(), taken.end());
+        auto text = bytes_.ConsumeRandomLengthString(16);
         std::ranges::replace(text, '\0', '0');
         return text;
     }
 
   private:
-    std::span<const std::uint8_t> bytes_;
+    FuzzedDataProvider bytes_;
 };
 
 /// Writes records into a message as a client would that gets some fields wrong: each may be left
